@@ -1,0 +1,152 @@
+// ReverbEngine holds everything the reverb needs between audio blocks: parameter values and the
+// coefficients derived from them, the delay networks, the input filter sections and the meter smoother.
+//
+// Threading: every operation is called with the owning core's lock held; the engine has no lock of its
+// own. Lifecycle vocabulary: the setters, Recalculate and ResetState may allocate (network sizing);
+// ProcessBlock never allocates except to grow the mono scratch buffer to a larger block than any before.
+//
+// Values that arrive through setters start outside their ranges (-1, -1.0, -100000.0): the first setting
+// of each always counts as a change, and rebuilds do nothing while a value they need is still unset.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+
+#include "processing/BiquadSection.h"
+#include "processing/DelayLine.h"
+
+namespace ulvetta {
+
+// The object whose meter value the block processor raises and decays (the effect core).
+struct LevelOwner {
+    float level = 0.0f;  // peak meter value, linear
+};
+
+class ReverbEngine {
+public:
+    static constexpr int kNetworkLines = 24;
+    static constexpr int kEarlyLines = 6;
+    static constexpr int kOutputTaps = 20;
+    static constexpr int kFilterSections = 6;
+
+    ReverbEngine();
+    virtual ~ReverbEngine();
+    ReverbEngine(const ReverbEngine&) = delete;
+    ReverbEngine& operator=(const ReverbEngine&) = delete;
+
+    // Parameter setters, in parameter-id order (levels arrive as linear gains, notch gain in dB,
+    // notch Q already scaled to 0.1..5.0).
+    void SetDiffusion(int v);
+    void SetPreDelay(int ms);
+    void SetDecay(int v);
+    void SetDamping(int v);
+    void SetRoomSize(int v);
+    void SetEarlyLevel(double g);
+    void SetWetLevel(double g);
+    void SetDryLevel(double g);
+    void SetColour(int v);
+    void SetInputGain(int tenthsDb);
+    void SetLowPassFreq(int hz);
+    void SetHighPassFreq(int hz);
+    void SetNotchFreq(int hz);
+    void SetNotchGain(double db);
+    void SetNotchQ(double q);
+    void SetMode(int m);
+
+    // Stores the stream rate and designs the meter smoother. A rate other than the one held also marks
+    // "Pre Delay" and "Notch Freq" unset, so the setters that follow derive them again for the new rate.
+    void SetSampleRate(int rate);
+    // Rebuilds the network of the current mode (allocates).
+    void Recalculate();
+    // Redesigns the notch sections once frequency, Q and gain are all set.
+    void UpdateNotch();
+    // Rebuilds and silences the engine at stream start.
+    void ResetState();
+
+    // Processes one block of stereo float audio; returns the number of output frames that carry signal.
+    // In and out are separate channel pointers with a common stride in samples.
+    int ProcessBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                     int stride, int accumulate, int flush);
+
+    // Fields, in declaration order. Public: the engine is a plain state record that the core, the kernels
+    // and the tests read directly.
+    LevelOwner* owner = nullptr;
+    int32_t sampleRate = 0;
+    int32_t mode = -1;
+    int32_t diffusion = -1;
+    int32_t preDelay = -1;
+    int32_t decay = -1;
+    int32_t damping = -1;
+    int32_t roomSize = -1;
+    double earlyLevel = -100000.0;
+    double wetLevel = -100000.0;
+    double dryLevel = -100000.0;
+    int32_t colour = -1;
+    int32_t lowPassFreq = -1;
+    int32_t highPassFreq = -1;
+    double notchQ = -1.0;
+    double notchGain = -100000.0;
+    int32_t notchFreq = -1;
+    double inputGain = 1.0;
+    bool preDelayOn = false;
+    double wetGain = 0.0;
+    double dryGain = 0.0;
+    double diffusionCoef = 0.0;
+    double decayCoef = 0.0;
+    double colourCutoff = 1.0;
+    double colourState = 0.0;
+    double colourState2 = 0.0;
+    double dampingCoef = 0.0;
+    double dampingStateLeft = 0.0;
+    double dampingStateRight = 0.0;
+    double earlyGain = 0.0;
+    double echoFeedback = 0.0;
+    OutputTap outputTaps[kOutputTaps];
+    DelayLine delayLines[kNetworkLines];
+    BiquadSection filterSections[kFilterSections];
+    DelayLine earlyLines[kEarlyLines];
+    PreDelayLine preDelayLine;
+    std::unique_ptr<float[]> monoBuffer;
+    int32_t monoCapacity = 0;  // frames
+    bool flushLatched = false;
+    bool tailTrimArmed = false;
+    float smoothCoefs[5] = {0, 0, 0, 0, 0};  // b0, b1, b2, a1, a2
+    float smoothState[4] = {0, 0, 0, 0};     // x1, x2, y1, y2
+    int32_t meterSource = 0;                 // 0 input, 1 output, 2 wet
+    int32_t partitionCount = 0;
+    int32_t irLength = 0;
+    int32_t convCounter = 0;
+
+    // Number of rebuilds that got past the unset-value guard (for tests and diagnostics).
+    int32_t rebuildCount = 0;
+
+private:
+    // The highest frequency a filter design receives: just under half the rate, so that a section
+    // stays stable at any rate while the parameter keeps the value the user set.
+    int designLimit(int hz) const;
+
+    // Pieces of the per-block frame shared by the kernels.
+    void latchFlush(int flush);
+    void decayMeter(int frames);
+    void meterInput(const float* inLeft, const float* inRight, int frames, int stride);
+    void makeMono(const float* inLeft, const float* inRight, int frames, int stride);
+    void filterMono(int frames);
+    void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
+                   int stride, int accumulate, double wetLeft, double wetRight);
+    void meterOutput(const float* outLeft, const float* outRight, int frames, int stride);
+    void flushKernelStates();
+    int trimmedLength(const float* outLeft, const float* outRight, int frames, int stride) const;
+
+    // Meter smoothing: one sample through the smoother, returning its output.
+    float smooth(float v);
+    void raiseLevel(float peak);
+    void cleanSmoothState();
+
+    int processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                     int stride, int accumulate, int flush);
+
+    // Running peak of the wet meter within the current block.
+    float wetPeak_ = 0.0f;
+};
+
+}  // namespace ulvetta

@@ -1,0 +1,81 @@
+#include "processing/DelayLine.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace ulvetta {
+
+namespace {
+
+// Length scale for rate r and room size R: r / 29761 / 50.
+double scaleFactor(int r) { return (1.0 + (r - 29761) * 3.360102147105272e-05) * 0.02; }
+
+bool isPrime(int32_t n) {
+    if (n < 2) return false;
+    for (int32_t d = 2; static_cast<int64_t>(d) * d <= n; ++d)
+        if (n % d == 0) return false;
+    return true;
+}
+
+}  // namespace
+
+void Modulator::SetModSampleRate(int32_t r) {
+    sampleRate = r;
+    Update();
+}
+
+void Modulator::SetModRate(double f) {
+    rate = f;
+    Update();
+}
+
+void Modulator::Update() {
+    if (rate == -1.0 || sampleRate == -1) return;
+    const double r = sampleRate / rate;
+    // The nearest integer to r + 0.5 with ties to even: a fractional period is rounded up.
+    period = static_cast<int32_t>(r > -0.5 ? std::nearbyint(r + 0.5) : std::nearbyint(r - 0.5));
+    periodLength = period;
+    phase = std::min(phase, period - 1);
+}
+
+double Modulator::Tick() {
+    const double m = depth * std::sin(3.141592653589793 * phase / periodLength);
+    if (++phase >= period) phase = 0;
+    return m;
+}
+
+void DelayLine::ConfigureLine(int sampleRate, int roomSize, int baseLength, double g, int depth, double rate,
+                              bool isNetworkLine) {
+    gain = g;
+    const double k = scaleFactor(sampleRate);
+    int32_t n = static_cast<int32_t>(std::round(baseLength * static_cast<double>(roomSize) * k));
+    if (n <= 0) n = 1;
+    if (isNetworkLine) {
+        n = std::max<int32_t>(n, 220);
+    } else {
+        n = std::max<int32_t>(n, 3);
+        while (!isPrime(n)) ++n;
+    }
+    if (depth != 0) {
+        depth = static_cast<int>(std::round(depth * static_cast<double>(roomSize) * k));
+        depth = std::max(depth, 1);
+    }
+    mod.reset();
+    if (depth > 0) {
+        mod.reset(new Modulator);
+        mod->SetModSampleRate(sampleRate);
+        mod->SetModRate(rate);
+        mod->SetModDepth(depth);
+    }
+    writeIndex = 0;
+    length = n;
+    samples.reset();
+    samples.reset(new double[n]);
+    std::fill(samples.get(), samples.get() + n, 0.0);
+}
+
+void DelayLine::Zero() {
+    if (samples) std::fill(samples.get(), samples.get() + length, 0.0);
+}
+
+}  // namespace ulvetta

@@ -1,0 +1,61 @@
+// The records of the delay networks: a recirculating or early-reflection line with an optional
+// modulator, the pre-delay line and an output tap. Sizing (ConfigureLine) allocates; clearing and the
+// per-sample elements never do.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+
+namespace ulvetta {
+
+// Swings a line's read point over one positive half sine per period.
+struct Modulator {
+    double rate = -1.0;          // Hz; -1 until set
+    int32_t sampleRate = -1;     // Hz; -1 until set
+    int32_t period = 0;          // samples, sampleRate / rate rounded up
+    double periodLength = 0.0;   // period as a double
+    int32_t phase = 0;           // sample counter, kept below period
+    int32_t depth = -1;          // excursion in samples; -1 until set
+
+    void SetModSampleRate(int32_t r);
+    void SetModRate(double f);
+    void SetModDepth(int32_t d) { depth = d; }
+    // The current excursion in samples; advances the phase.
+    double Tick();
+
+private:
+    void Update();
+};
+
+struct DelayLine {
+    int32_t writeIndex = 0;
+    int32_t length = 0;
+    std::unique_ptr<double[]> samples;  // length doubles; null before the first configuration
+    double gain = 0.0;
+    std::unique_ptr<Modulator> mod;     // null when the line is not modulated
+
+    // Sizes the line for rate and room size from its length at 29761 Hz and room size 50; allocates and
+    // zeroes its storage. A network line has at least 220 samples; an early line is raised to a prime.
+    void ConfigureLine(int sampleRate, int roomSize, int baseLength, double gain, int depth, double rate,
+                       bool isNetworkLine);
+    // Zeroes the stored samples; the write position stays.
+    void Zero();
+    bool configured() const { return samples != nullptr; }
+};
+
+// Circular pre-delay buffer; moves upwards, unlike the network lines.
+struct PreDelayLine {
+    int32_t length = 0;
+    std::unique_ptr<double[]> samples;
+    int32_t writeIndex = 0;
+
+    // Frees the old storage and allocates n zeroed samples.
+    void Create(int32_t n);
+};
+
+struct OutputTap {
+    int32_t index = 0;   // read position in its line, below length
+    int32_t length = 0;  // length of the line it reads
+};
+
+}  // namespace ulvetta
