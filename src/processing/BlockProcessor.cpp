@@ -12,7 +12,7 @@ namespace ulvetta {
 
 namespace {
 
-constexpr float kMeterDecayPerMs = 0.9993910013652971f;
+constexpr double kMeterDecayPerMs = 0.9993910013652971;  // -0.00529 dB per millisecond
 
 // A non-finite input sample (from a faulty upstream source) is taken as silence, so that it can never
 // poison the recirculating state or the mix.
@@ -61,7 +61,7 @@ void ReverbEngine::latchFlush(int flush) {
 void ReverbEngine::decayMeter(int frames) {
     if (owner == nullptr || sampleRate <= 0) return;
     const int ms = static_cast<int>(static_cast<int64_t>(frames) * 1000 / sampleRate);
-    owner->level = owner->level * std::pow(kMeterDecayPerMs, static_cast<float>(ms));
+    owner->level = owner->level * static_cast<float>(std::pow(kMeterDecayPerMs, ms));
 }
 
 void ReverbEngine::meterInput(const float* inLeft, const float* inRight, int frames, int stride) {

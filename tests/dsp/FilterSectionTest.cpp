@@ -1,0 +1,114 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <complex>
+#include <vector>
+
+#include "processing/BiquadSection.h"
+
+using namespace ulvetta;
+
+namespace {
+
+// Magnitude of the section's response at frequency f for rate r, from its coefficients.
+double magnitude(const BiquadSection& s, double f, double r) {
+    const std::complex<double> z1 = std::polar(1.0, -2.0 * M_PI * f / r);
+    const std::complex<double> z2 = z1 * z1;
+    return std::abs((s.b0 + s.b1 * z1 + s.b2 * z2) / (1.0 + s.a1 * z1 + s.a2 * z2));
+}
+
+// Steady-state gain measured by running a sine through the section.
+double measuredGain(BiquadSection s, double f, int r) {
+    const int n = r;  // one second
+    std::vector<float> x(n);
+    for (int i = 0; i < n; ++i) x[i] = static_cast<float>(0.5 * std::sin(2.0 * M_PI * f * i / r));
+    ProcessMono(s, x.data(), n);
+    double peak = 0.0;
+    for (int i = n / 2; i < n; ++i) peak = std::max(peak, std::fabs(static_cast<double>(x[i])));
+    return peak / 0.5;
+}
+
+}  // namespace
+
+TEST(FilterSection, LowPassHasNoResonantPeakAndFilters) {
+    for (int f : {20, 1000, 9999}) {
+        BiquadSection s;
+        DesignLowPass(s, 44100, f);
+        EXPECT_NEAR(magnitude(s, 0.0, 44100), 1.0, 1e-9);
+        for (double g = 1.0; g < 22050.0; g *= 1.05) EXPECT_LE(magnitude(s, g, 44100), 1.0 + 1e-9) << f << " at " << g;
+        // Q 0.5: -6 dB at the corner.
+        EXPECT_NEAR(magnitude(s, f, 44100), 0.5, 1e-6);
+    }
+    BiquadSection s;
+    DesignLowPass(s, 44100, 9999);
+    EXPECT_LT(measuredGain(s, 15000.0, 44100), 0.3);
+}
+
+TEST(FilterSection, HighPassCutsLowsAndPassesHighs) {
+    BiquadSection s;
+    DesignHighPass(s, 44100, 101);
+    EXPECT_NEAR(magnitude(s, 101, 44100), 0.5, 1e-6);
+    EXPECT_NEAR(magnitude(s, 22050.0, 44100), 1.0, 1e-9);
+    EXPECT_LT(measuredGain(s, 20.0, 44100), 0.1);
+}
+
+TEST(FilterSection, NotchBoostsAndCutsAtItsFrequency) {
+    BiquadSection cut, boost;
+    DesignNotch(cut, 48000, 2000, 3.0, -12.0);
+    DesignNotch(boost, 48000, 2000, 3.0, 12.0);
+    EXPECT_NEAR(20.0 * std::log10(magnitude(cut, 2000, 48000)), -12.0, 1e-6);
+    EXPECT_NEAR(20.0 * std::log10(magnitude(boost, 2000, 48000)), 12.0, 1e-6);
+    EXPECT_NEAR(measuredGain(cut, 2000, 48000), std::pow(10.0, -0.6), 0.01);
+    // Far from the centre the peaking section is flat.
+    EXPECT_NEAR(magnitude(cut, 20.0, 48000), 1.0, 1e-3);
+}
+
+TEST(FilterSection, OneDecibelNotchAndBypassPassUnchanged) {
+    BiquadSection s;
+    DesignLowPass(s, 44100, 500);  // something other than bypass first
+    DesignNotch(s, 44100, 1000, 3.0, 1.0);
+    std::vector<float> x = {1.0f, -0.25f, 0.5f, 0.125f, -1.0f};
+    std::vector<float> y = x;
+    ProcessMono(s, y.data(), static_cast<int>(y.size()));
+    EXPECT_EQ(x, y);
+    BiquadSection b;
+    b.SetBypass();
+    std::vector<float> st = {0.1f, -0.2f, 0.3f, -0.4f};
+    std::vector<float> st2 = st;
+    ProcessInterleaved(b, st2.data(), 2);
+    EXPECT_EQ(st, st2);
+}
+
+TEST(FilterSection, StereoFormKeepsChannelsApartAndMatchesMono) {
+    BiquadSection mono, stereo;
+    DesignLowPass(mono, 44100, 800);
+    DesignLowPass(stereo, 44100, 800);
+    std::vector<float> left(256), inter(512);
+    for (int i = 0; i < 256; ++i) {
+        left[i] = static_cast<float>(std::sin(i * 0.3));
+        inter[2 * i] = left[i];
+        inter[2 * i + 1] = 0.0f;
+    }
+    ProcessMono(mono, left.data(), 256);
+    ProcessInterleaved(stereo, inter.data(), 256);
+    for (int i = 0; i < 256; ++i) {
+        EXPECT_EQ(inter[2 * i], left[i]);
+        EXPECT_EQ(inter[2 * i + 1], 0.0f);
+    }
+}
+
+TEST(FilterSection, DecaysToExactZerosNeverDenormals) {
+    BiquadSection s;
+    DesignNotch(s, 44100, 3000, 0.5, 12.0);
+    std::vector<float> x(4096, 0.0f);
+    for (int i = 0; i < 64; ++i) x[i] = (i % 2) ? 1.0f : -1.0f;
+    ProcessMono(s, x.data(), 4096);
+    for (int block = 0; block < 200; ++block) {
+        std::fill(x.begin(), x.end(), 0.0f);
+        ProcessMono(s, x.data(), 4096);
+    }
+    for (double v : {s.x1L, s.x2L, s.y1L, s.y2L}) {
+        EXPECT_EQ(v, 0.0);
+        EXPECT_NE(std::fpclassify(v), FP_SUBNORMAL);
+    }
+}
