@@ -3,6 +3,10 @@
 add_library(ulvetta_options INTERFACE)
 target_compile_options(ulvetta_options INTERFACE
   -Wall -Wextra -Werror -ffp-contract=off)
+if(WIN32)
+  # M_PI and friends under strict C++17 with the mingw-w64 headers.
+  target_compile_definitions(ulvetta_options INTERFACE _USE_MATH_DEFINES)
+endif()
 
 # Sanitizer builds: ULVETTA_SANITIZE is "address" (AddressSanitizer + UndefinedBehaviorSanitizer) or "thread".
 set(ULVETTA_SANITIZE "" CACHE STRING "Sanitizer build: address or thread")

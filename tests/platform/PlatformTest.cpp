@@ -106,6 +106,6 @@ TEST(ModulePath, NamesThisExecutable) {
     EXPECT_NE(path.find("platform_tests"), std::string::npos);
     std::string dir = moduleDirectory();
     ASSERT_FALSE(dir.empty());
-    EXPECT_EQ(dir.back(), '/');
+    EXPECT_TRUE(dir.back() == '/' || dir.back() == '\\');
     EXPECT_EQ(path.compare(0, dir.size(), dir), 0);
 }
