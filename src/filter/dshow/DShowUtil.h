@@ -1,0 +1,70 @@
+// Small helpers shared by the DirectShow side of the module: media-type copies, the module's object and
+// lock counts, reference-counted pointers and time conversion. Windows only.
+#pragma once
+
+#include <windows.h>
+#include <dshow.h>
+
+#include <atomic>
+#include <cstdint>
+
+namespace ulvetta {
+namespace dshow {
+
+// Live COM objects and server locks of the module; DllCanUnloadNow answers from them.
+extern std::atomic<long> g_objectCount;
+extern std::atomic<long> g_lockCount;
+extern HMODULE g_module;
+
+// Deep copy of a media type (the format block is duplicated with CoTaskMemAlloc).
+HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source);
+// Frees what a media type owns (format block and unknown) and clears it.
+void FreeMediaType(AM_MEDIA_TYPE& mt);
+// Frees a media type allocated with CoTaskMemAlloc together with what it owns.
+void DeleteMediaType(AM_MEDIA_TYPE* mt);
+// A media type allocated with CoTaskMemAlloc holding a copy of source; null on failure.
+AM_MEDIA_TYPE* CreateMediaType(const AM_MEDIA_TYPE* source);
+
+// The WAVEFORMATEX of a media type, or null when its format block is shorter than 16 bytes.
+const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt);
+
+// Reference times (100 ns) to samples at a rate: milliseconds first, truncating at each division.
+inline int64_t RefTimeToSamples(REFERENCE_TIME t, uint32_t rate) {
+    return (t / 10000) * static_cast<int64_t>(rate) / 1000;
+}
+
+// Holds one reference to a COM object.
+template <class T>
+class ComRef {
+public:
+    ComRef() = default;
+    ComRef(T* p) : p_(p) {  // takes a new reference
+        if (p_) p_->AddRef();
+    }
+    ComRef(const ComRef& o) : ComRef(o.p_) {}
+    ComRef& operator=(const ComRef& o) {
+        reset(o.p_);
+        return *this;
+    }
+    ~ComRef() { reset(); }
+    void reset(T* p = nullptr) {
+        if (p) p->AddRef();
+        T* old = p_;
+        p_ = p;
+        if (old) old->Release();
+    }
+    // Releases what is held and returns the slot for an out-parameter that already carries a reference.
+    T** put() {
+        reset();
+        return &p_;
+    }
+    T* get() const { return p_; }
+    T* operator->() const { return p_; }
+    explicit operator bool() const { return p_ != nullptr; }
+
+private:
+    T* p_ = nullptr;
+};
+
+}  // namespace dshow
+}  // namespace ulvetta
