@@ -1,0 +1,33 @@
+// Builds real DirectShow graphs around Ulvetta for the tests: File Source -> WAVE Parser -> Ulvetta ->
+// SampleGrabber -> Null Renderer, with no reference clock, and collects what reaches the grabber.
+#pragma once
+
+#include <windows.h>
+#include <dshow.h>
+
+#include <string>
+#include <vector>
+
+namespace ulvetta {
+namespace test {
+
+struct GraphResult {
+    HRESULT hr = E_FAIL;          // the first failure while building or running, else S_OK
+    std::string step;             // where it failed
+    WAVEFORMATEX format{};        // the grabber's connection format
+    std::vector<float> samples;   // interleaved output, 16-bit scaled by 1/32768
+    std::vector<long> sampleSizes;  // bytes of each media sample the grabber saw
+    bool completed = false;       // EC_COMPLETE arrived
+};
+
+// Path of the module under test; loaded and registered by the test executable.
+std::wstring ModulePath();
+
+// Runs a WAV file through the filter. state: an 88-byte settings record to load first (may be empty).
+// prepare: called with the filter after it joined the graph and its input is connected.
+using Prepare = void (*)(IBaseFilter* filter, void* context);
+GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state, Prepare prepare = nullptr,
+                     void* context = nullptr);
+
+}  // namespace test
+}  // namespace ulvetta

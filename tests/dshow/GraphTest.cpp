@@ -1,0 +1,263 @@
+// Ulvetta.ax registered and run in real graphs of the platform's DirectShow: registration, output equal
+// to the command-line renderer's for the same file and settings, the tail drain, saved state across
+// filters and automation timing.
+#include <windows.h>
+#include <dshow.h>
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstring>
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "GraphHost.h"
+#include "filter/CoreState.h"
+#include "filter/ReverbCore.h"
+#include "filter/dshow/DShowUtil.h"
+#include "filter/dshow/Interfaces.h"
+
+using namespace ulvetta;
+using namespace ulvetta::test;
+
+namespace {
+
+// Build paths arrive as POSIX paths; Wine maps the root to drive Z:.
+std::wstring WinePath(const std::string& posix) {
+    std::wstring w = L"Z:";
+    for (char c : posix) w += (c == '/') ? L'\\' : static_cast<wchar_t>(c);
+    return w;
+}
+
+std::string CasesDir() { return ULVETTA_GRAPH_CASES; }
+
+using RegisterFn = HRESULT(WINAPI*)();
+
+HMODULE Module() {
+    static HMODULE m = LoadLibraryW(ModulePath().c_str());
+    return m;
+}
+
+HRESULT CallExport(const char* name) {
+    auto fn = reinterpret_cast<RegisterFn>(reinterpret_cast<void*>(GetProcAddress(Module(), name)));
+    return fn ? fn() : E_NOTIMPL;
+}
+
+bool KeyExists(const std::wstring& path) {
+    HKEY k = nullptr;
+    if (RegOpenKeyExW(HKEY_CLASSES_ROOT, path.c_str(), 0, KEY_READ, &k) != ERROR_SUCCESS) return false;
+    RegCloseKey(k);
+    return true;
+}
+
+std::wstring StringValue(const std::wstring& path, const wchar_t* name) {
+    wchar_t data[1024] = {};
+    DWORD bytes = sizeof data;
+    if (RegGetValueW(HKEY_CLASSES_ROOT, path.c_str(), name, RRF_RT_REG_SZ, nullptr, data, &bytes) != ERROR_SUCCESS)
+        return L"<missing>";
+    return data;
+}
+
+int CountSubkeysNamed(const std::wstring& path, const std::wstring& name) {
+    HKEY k = nullptr;
+    if (RegOpenKeyExW(HKEY_CLASSES_ROOT, path.c_str(), 0, KEY_READ, &k) != ERROR_SUCCESS) return 0;
+    int n = 0;
+    wchar_t sub[256];
+    for (DWORD i = 0;; ++i) {
+        DWORD len = 256;
+        if (RegEnumKeyExW(k, i, sub, &len, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
+        if (_wcsicmp(sub, name.c_str()) == 0) ++n;
+    }
+    RegCloseKey(k);
+    return n;
+}
+
+const std::wstring kFilterKey = L"CLSID\\{3818A521-3F15-11D5-9EDA-0010B5071E57}";
+const std::wstring kPageKey = L"CLSID\\{3818A522-3F15-11D5-9EDA-0010B5071E57}";
+
+// Registers the module for the graph tests and removes it afterwards.
+class Registered : public ::testing::Environment {
+public:
+    void SetUp() override { ASSERT_EQ(CallExport("DllRegisterServer"), S_OK); }
+    void TearDown() override { CallExport("DllUnregisterServer"); }
+};
+const auto* const g_env = ::testing::AddGlobalTestEnvironment(new Registered);
+
+std::vector<unsigned char> ReadFile(const std::string& path) {
+    std::ifstream f(path, std::ios::binary);
+    return std::vector<unsigned char>((std::istreambuf_iterator<char>(f)), std::istreambuf_iterator<char>());
+}
+
+std::vector<float> ReadRawFloats(const std::string& path) {
+    std::vector<unsigned char> b = ReadFile(path);
+    std::vector<float> v(b.size() / 4);
+    std::memcpy(v.data(), b.data(), v.size() * 4);
+    return v;
+}
+
+}  // namespace
+
+namespace ulvetta {
+namespace test {
+std::wstring ModulePath() { return WinePath(ULVETTA_AX_PATH); }
+}  // namespace test
+}  // namespace ulvetta
+
+TEST(Registration, WritesOneSetOfKeysAndRemovesThemAll) {
+    ASSERT_EQ(CallExport("DllRegisterServer"), S_OK);  // a second time
+    EXPECT_EQ(StringValue(kFilterKey, nullptr), L"Morvane Ulvetta");
+    EXPECT_EQ(StringValue(kPageKey, nullptr), L"Morvane Ulvetta Property Page");
+    EXPECT_EQ(_wcsicmp(StringValue(kFilterKey + L"\\InprocServer32", nullptr).c_str(), ModulePath().c_str()), 0);
+    EXPECT_EQ(StringValue(kFilterKey + L"\\InprocServer32", L"ThreadingModel"), L"Both");
+    EXPECT_EQ(StringValue(kPageKey + L"\\InprocServer32", L"ThreadingModel"), L"Both");
+    // One filter-mapper record however often it was registered.
+    EXPECT_EQ(CountSubkeysNamed(L"Filter", L"{3818A521-3F15-11D5-9EDA-0010B5071E57}"), 1);
+    EXPECT_EQ(CountSubkeysNamed(L"CLSID", L"{3818A521-3F15-11D5-9EDA-0010B5071E57}"), 1);
+    EXPECT_TRUE(KeyExists(kFilterKey + L"\\Pins\\Input"));
+    EXPECT_TRUE(KeyExists(kFilterKey + L"\\Pins\\Output"));
+
+    ASSERT_EQ(CallExport("DllUnregisterServer"), S_OK);
+    EXPECT_FALSE(KeyExists(kFilterKey));
+    EXPECT_FALSE(KeyExists(kPageKey));
+    EXPECT_FALSE(KeyExists(L"Filter\\{3818A521-3F15-11D5-9EDA-0010B5071E57}"));
+    ASSERT_EQ(CallExport("DllRegisterServer"), S_OK);
+}
+
+TEST(Server, ClassFactoryAndUnloading) {
+    using GetClassObjectFn = HRESULT(WINAPI*)(REFCLSID, REFIID, void**);
+    auto getClassObject =
+        reinterpret_cast<GetClassObjectFn>(reinterpret_cast<void*>(GetProcAddress(Module(), "DllGetClassObject")));
+    ASSERT_NE(getClassObject, nullptr);
+    dshow::ComRef<IClassFactory> factory;
+    ASSERT_EQ(getClassObject(CLSID_UlvettaFilter, IID_IClassFactory, reinterpret_cast<void**>(factory.put())), S_OK);
+    EXPECT_EQ(CallExport("DllCanUnloadNow"), S_FALSE);
+    dshow::ComRef<IBaseFilter> filter;
+    ASSERT_EQ(factory->CreateInstance(nullptr, IID_IBaseFilter, reinterpret_cast<void**>(filter.put())), S_OK);
+    IUnknown* outer = reinterpret_cast<IUnknown*>(0x1);
+    void* p = nullptr;
+    EXPECT_EQ(factory->CreateInstance(outer, IID_IBaseFilter, &p), E_NOINTERFACE);
+    dshow::ComRef<IClassFactory> pageFactory;
+    ASSERT_EQ(getClassObject(CLSID_UlvettaPropertyPage, IID_IClassFactory, reinterpret_cast<void**>(pageFactory.put())),
+              S_OK);
+    EXPECT_EQ(pageFactory->CreateInstance(nullptr, IID_IUnknown, &p), CLASS_E_CLASSNOTAVAILABLE);
+    EXPECT_EQ(getClassObject(GUID_NULL, IID_IClassFactory, &p), CLASS_E_CLASSNOTAVAILABLE);
+    filter.reset();
+    factory.reset();
+    pageFactory.reset();
+    EXPECT_EQ(CallExport("DllCanUnloadNow"), S_OK);
+}
+
+// Each case: a WAV file, a settings record and the command-line renderer's output for them (raw floats),
+// made by the fixture script.
+TEST(Graph, OutputEqualsTheCommandLineRendererAndTheTailDrains) {
+    std::ifstream list(CasesDir() + "/cases.txt");
+    ASSERT_TRUE(list.good()) << "no graph cases in " << CasesDir();
+    std::string line;
+    int cases = 0;
+    while (std::getline(list, line)) {
+        std::istringstream fields(line);
+        std::string name, wav, state, ref;
+        fields >> name >> wav >> state >> ref;
+        if (name.empty()) continue;
+        SCOPED_TRACE(name);
+        ++cases;
+        GraphResult r = RunGraph(WinePath(CasesDir() + "/" + wav), ReadFile(CasesDir() + "/" + state));
+        ASSERT_EQ(r.hr, S_OK) << r.step;
+        ASSERT_TRUE(r.completed);
+        // Float files reach the filter as WAVE_FORMAT_EXTENSIBLE; downstream gets the plain stereo form.
+        EXPECT_EQ(r.format.wFormatTag, name.find("f32") != std::string::npos ? WAVE_FORMAT_IEEE_FLOAT : WAVE_FORMAT_PCM);
+        EXPECT_EQ(r.format.cbSize, 0);
+        const std::vector<float> expected = ReadRawFloats(CasesDir() + "/" + ref);
+        ASSERT_GT(expected.size(), 0u);
+        // The filter drains in buffers of its allocator's size, the renderer in its block size: the filter may
+        // go on past the renderer's end, but only with silence.
+        ASSERT_GE(r.samples.size(), expected.size());
+        // The two builds use different maths libraries (sin, cos, pow, exp): coefficients may differ in the
+        // last bit, which can move a 16-bit result across one truncation step, or a float one by far less.
+        const float tolerance = r.format.wFormatTag == WAVE_FORMAT_PCM ? 1.0f / 32768.0f + 1e-9f : 2e-6f;
+        size_t worst = 0;
+        float worstDiff = 0.0f;
+        for (size_t i = 0; i < expected.size(); ++i) {
+            const float d = std::fabs(r.samples[i] - expected[i]);
+            if (d > worstDiff) {
+                worstDiff = d;
+                worst = i;
+            }
+        }
+        EXPECT_LE(worstDiff, tolerance) << "at sample " << worst << " of " << expected.size();
+        for (size_t i = expected.size(); i < r.samples.size(); ++i)
+            ASSERT_LE(std::fabs(r.samples[i]), 1e-15f) << "after the renderer's end, sample " << i;
+    }
+    EXPECT_GE(cases, 8);
+}
+
+namespace {
+
+struct EnvelopeContext {
+    int64_t at;  // sample where the dry level drops to silence
+};
+
+void AddMuteEnvelope(IBaseFilter* filter, void* context) {
+    auto* c = static_cast<EnvelopeContext*>(context);
+    dshow::ComRef<IMediaParams> params;
+    filter->QueryInterface(__uuidof(IMediaParams), reinterpret_cast<void**>(params.put()));
+    MP_ENVELOPE_SEGMENT seg{};
+    // Sample s at 44100 Hz as a reference time that converts back to s exactly (whole milliseconds).
+    seg.rtStart = c->at * 1000 / 44100 * 10000;
+    seg.rtEnd = seg.rtStart + 50 * 10000;
+    seg.valStart = 0.0f;  // "Output Level Dry" at its minimum: -Inf.
+    seg.valEnd = 0.0f;
+    seg.iCurve = MP_CURVE_JUMP;
+    params->AddEnvelope(kOutputLevelDry, 1, &seg);
+}
+
+}  // namespace
+
+TEST(Graph, EnvelopeChangesItsParameterAtTheRightSample) {
+    // Settings with the wet path off, so the output is the dry input until the envelope mutes it.
+    ReverbCore core;
+    core.setValue(kOutputLevelWet, -600);
+    std::vector<unsigned char> state(kCoreStateSize);
+    core.saveState(state.data());
+    // The block of 40 ms that starts at sample 1764 * 3 = 5292, in its 5 ms chunk at offset 2 * 220, begins
+    // at sample 5732, which is also a whole millisecond (130 ms).
+    EnvelopeContext ctx{5733 - 1};
+    GraphResult r = RunGraph(WinePath(CasesDir() + "/dc-44100-f32.wav"), state, &AddMuteEnvelope, &ctx);
+    ASSERT_EQ(r.hr, S_OK) << r.step;
+    ASSERT_GT(r.samples.size(), 2u * 6000);
+    const int64_t expectedFrame = 5732;
+    for (int64_t i = 0; i < 6000; ++i) {
+        const float l = r.samples[2 * i];
+        if (i < expectedFrame)
+            ASSERT_NEAR(l, 0.5f, 1e-6f) << "frame " << i;
+        else
+            ASSERT_EQ(l, 0.0f) << "frame " << i;
+    }
+}
+
+TEST(Graph, StateSavedFromOneFilterLoadsIntoAFreshOne) {
+    ReverbCore core;
+    core.setValue(kAlgorithm, 7);
+    core.setValue(kPreDelay, 77);
+    std::vector<unsigned char> state(kCoreStateSize);
+    core.saveState(state.data());
+    std::vector<unsigned char> saved;
+    auto capture = [](IBaseFilter* filter, void* context) {
+        auto* out = static_cast<std::vector<unsigned char>*>(context);
+        dshow::ComRef<IPersistStream> p;
+        filter->QueryInterface(IID_IPersistStream, reinterpret_cast<void**>(p.put()));
+        dshow::ComRef<IStream> s;
+        CreateStreamOnHGlobal(nullptr, TRUE, s.put());
+        p->Save(s.get(), TRUE);
+        HGLOBAL h = nullptr;
+        GetHGlobalFromStream(s.get(), &h);
+        auto* bytes = static_cast<unsigned char*>(GlobalLock(h));
+        out->assign(bytes, bytes + 88);
+        GlobalUnlock(h);
+    };
+    GraphResult r = RunGraph(WinePath(CasesDir() + "/dc-44100-f32.wav"), state, capture, &saved);
+    ASSERT_EQ(r.hr, S_OK) << r.step;
+    EXPECT_EQ(saved, state);
+}

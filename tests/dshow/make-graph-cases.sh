@@ -1,0 +1,52 @@
+#!/usr/bin/env bash
+# Makes the graph tests' inputs and references: WAV files at several rates in 16-bit PCM and float, a
+# settings record per case, and the Linux renderer's output for each as raw interleaved float32.
+# Usage: make-graph-cases.sh OUTDIR ULVETTA
+set -euo pipefail
+out="$1"
+cli="$2"
+if [ ! -x "$cli" ]; then
+  echo "the graph tests need the Linux renderer at $cli: build the native preset first" >&2
+  exit 1
+fi
+rm -rf "$out"
+mkdir -p "$out/presets"
+cd "$out"
+
+# A short stereo phrase: two tones with different envelopes per channel, and a noise burst.
+make_input() {  # file rate encoding...
+  local file="$1" rate="$2"
+  shift 2
+  sox -D -n -r "$rate" -c 2 "$@" "$file" synth 0.5 sine 440 sine 660 fade q 0.01 0.5 0.3 gain -8 \
+    : synth 0.15 pinknoise fade q 0.005 0.15 0.1 gain -12
+}
+
+: > cases.txt
+add_case() {  # rate format algorithm
+  local rate="$1" format="$2" algorithm="$3"
+  local name="alg${algorithm}-${rate}-${format}"
+  local enc=(-b 16)
+  [ "$format" = f32 ] && enc=(-e floating-point -b 32)
+  make_input "$name.wav" "$rate" "${enc[@]}"
+  "$cli" presets save "$name" --algorithm "$algorithm" --set "Output Level Wet=-6" --dir presets >/dev/null
+  cp "presets/$name.stp" "$name.stp"
+  # The WAVE parser delivers 40 ms per sample; the renderer uses the same block size.
+  local block=$((rate * 40 / 1000))
+  "$cli" render "$name.wav" "$name-ref.wav" --state "$name.stp" --block "$block"
+  sox "$name-ref.wav" -t f32 "$name-ref.raw"
+  echo "$name $name.wav $name.stp $name-ref.raw" >> cases.txt
+}
+
+add_case 22050 s16 1
+add_case 22050 f32 7
+add_case 44100 s16 2
+add_case 44100 f32 0
+add_case 48000 s16 6
+add_case 48000 f32 1
+add_case 96000 s16 0
+add_case 96000 f32 7
+
+# Constant 0.5 on both channels, for the automation timing test.
+perl -e 'print pack("f<", 0.5) x (2 * 13230)' > dc.raw
+sox -D -t f32 -r 44100 -c 2 dc.raw -e floating-point -b 32 dc-44100-f32.wav
+echo "made $(wc -l < cases.txt) graph cases in $out"
