@@ -3,6 +3,7 @@
 // filters and automation timing.
 #include <windows.h>
 #include <dshow.h>
+#include <mmreg.h>
 
 #include <gtest/gtest.h>
 
