@@ -152,6 +152,11 @@ void ReverbEngine::SetSampleRate(int rate) {
     smoothCoefs[4] = static_cast<float>((1.0 - alpha) * n);
 }
 
+void ReverbEngine::ClearEndOfStream() {
+    flushLatched = false;
+    tailTrimArmed = false;
+}
+
 void ReverbEngine::ResetState() {
     Recalculate();
     tailTrimArmed = false;

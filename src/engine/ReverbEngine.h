@@ -62,6 +62,9 @@ public:
     void UpdateNotch();
     // Rebuilds and silences the engine at stream start.
     void ResetState();
+    // Forgets that the stream had ended (the flush latch and the tail trimming), keeping the sound: a
+    // seek after the end of a stream plays on without its blocks being trimmed.
+    void ClearEndOfStream();
 
     // Processes one block of stereo float audio; returns the number of output frames that carry signal.
     // In and out are separate channel pointers with a common stride in samples.

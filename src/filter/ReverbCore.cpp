@@ -250,6 +250,11 @@ bool ReverbCore::startStreaming() {
     return true;
 }
 
+void ReverbCore::resumeAfterFlush() {
+    MutexLock g(lock_);
+    engine_.ClearEndOfStream();
+}
+
 void ReverbCore::stopStreaming() {
     MutexLock g(lock_);
     stopped_ = true;

@@ -107,6 +107,9 @@ public:
     virtual void resetLevel();
     virtual bool startStreaming();
     virtual void stopStreaming();
+    // After a flush (a seek): the stream goes on, so an earlier end of stream no longer trims its blocks.
+    // The reverb's sound state carries over.
+    void resumeAfterFlush();
 
     // The settings record.
     virtual int32_t stateSize();

@@ -6,6 +6,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -388,4 +389,36 @@ TEST(FilterAutomation, CaptureReportsEditorChanges) {
     params->SetParam(kDecay, 0.5f);  // the host's own changes are not reported back
     EXPECT_EQ(cb.calls.size(), 3u);
     setter->SetCaptureCallback(nullptr);
+}
+
+TEST(FilterStreaming, SixteenBitOutputClampsAndConvertsLikeTheRenderer) {
+    FilterHolder f;
+    WaveType pcm(WAVE_FORMAT_PCM, 2, 44100, 16);
+    f.filter->SetMediaType(PINDIR_INPUT, pcm);
+    f.filter->SetMediaType(PINDIR_OUTPUT, pcm);
+    ReverbCore* core = f.filter->Control().GetCore();
+    core->setValue(kOutputLevelWet, -600);
+    core->setValue(kOutputLevelDry, 60);  // +6 dB
+    core->startStreaming();
+    const int16_t in[8] = {32767, -32768, 100, -101, 20000, -20000, 0, 1};
+    int16_t out[8] = {};
+    bool shortfall = true;
+    const int produced = f.filter->Control().Process(kModeOrdinary, reinterpret_cast<const BYTE*>(in), 4,
+                                                     reinterpret_cast<BYTE*>(out), 4, &shortfall);
+    ASSERT_EQ(produced, 4);
+    EXPECT_FALSE(shortfall);
+    const double g = std::pow(10.0, 0.3);
+    EXPECT_EQ(out[0], 32767);   // clamped, never wrapped
+    EXPECT_EQ(out[1], -32768);
+    EXPECT_EQ(out[2], static_cast<int16_t>(std::trunc(static_cast<float>(100 / 32768.0f * g) * 32768.0)));
+    EXPECT_EQ(out[3], static_cast<int16_t>(std::trunc(static_cast<float>(-101 / 32768.0f * g) * 32768.0)));
+    EXPECT_EQ(out[4], 32767);
+    EXPECT_EQ(out[5], -32768);
+    EXPECT_EQ(out[6], 0);
+    EXPECT_EQ(out[7], 1);  // 1.995 truncated toward zero
+    // The drain processes silence into the whole buffer; with no tail and no pre-delay content it ends at once.
+    int16_t tail[64];
+    core->setValue(kPreDelay, 0);
+    EXPECT_EQ(f.filter->Control().Process(kModeDrain, nullptr, 0, reinterpret_cast<BYTE*>(tail), 32, &shortfall), 0);
+    EXPECT_TRUE(shortfall);
 }

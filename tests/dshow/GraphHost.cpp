@@ -75,7 +75,7 @@ public:
 }  // namespace
 
 GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state, Prepare prepare,
-                     void* context) {
+                     void* context, bool replay) {
     GraphResult r;
     Collector collector;
     {
@@ -136,6 +136,10 @@ GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned cha
             r.format = *reinterpret_cast<WAVEFORMATEX*>(mt.pbFormat);
         dshow::FreeMediaType(mt);
 
+        ComRef<IMediaSeeking> seeking;
+        if (SUCCEEDED(graph->QueryInterface(IID_IMediaSeeking, reinterpret_cast<void**>(seeking.put()))))
+            seeking->GetDuration(&r.duration);
+
         ComRef<IMediaFilter> mediaFilter;
         graph->QueryInterface(IID_IMediaFilter, reinterpret_cast<void**>(mediaFilter.put()));
         mediaFilter->SetSyncSource(nullptr);  // as fast as the processor allows
@@ -146,15 +150,34 @@ GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned cha
         hr = control->Run();
         if (FAILED(hr)) return fail("run", hr);
         // Our own deadline: WaitForCompletion and GetEvent may return early.
-        const DWORD deadline = GetTickCount() + 120000;
-        while (!r.completed && GetTickCount() < deadline) {
-            long code = 0;
-            LONG_PTR p1 = 0, p2 = 0;
-            if (events->GetEvent(&code, &p1, &p2, 100) == S_OK) {
-                events->FreeEventParams(code, p1, p2);
-                if (code == EC_COMPLETE) r.completed = true;
-                if (code == EC_ERRORABORT) return fail("stream error", static_cast<HRESULT>(p1));
+        auto waitForCompletion = [&]() -> HRESULT {
+            const DWORD deadline = GetTickCount() + 120000;
+            r.completed = false;
+            while (!r.completed && GetTickCount() < deadline) {
+                long code = 0;
+                LONG_PTR p1 = 0, p2 = 0;
+                if (events->GetEvent(&code, &p1, &p2, 100) == S_OK) {
+                    events->FreeEventParams(code, p1, p2);
+                    if (code == EC_COMPLETE) r.completed = true;
+                    if (code == EC_ERRORABORT) return static_cast<HRESULT>(p1);
+                }
             }
+            return S_OK;
+        };
+        hr = waitForCompletion();
+        if (FAILED(hr)) return fail("stream error", hr);
+        if (replay && r.completed) {
+            {
+                std::lock_guard<std::mutex> g(collector.m);
+                r.firstPassSamples = collector.bytes.size();
+            }
+            LONGLONG zero = 0;
+            hr = seeking ? seeking->SetPositions(&zero, AM_SEEKING_AbsolutePositioning, nullptr,
+                                                 AM_SEEKING_NoPositioning)
+                         : E_NOINTERFACE;
+            if (FAILED(hr)) return fail("seek", hr);
+            hr = waitForCompletion();
+            if (FAILED(hr)) return fail("stream error after the seek", hr);
         }
         control->Stop();
         graph->Disconnect(sourceOut.get());
@@ -163,6 +186,7 @@ GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned cha
     const bool pcm16 = r.format.wFormatTag == WAVE_FORMAT_PCM;
     std::lock_guard<std::mutex> g(collector.m);
     r.sampleSizes = collector.sizes;
+    if (pcm16) r.firstPassSamples /= 2; else r.firstPassSamples /= 4;
     if (pcm16) {
         const auto* s = reinterpret_cast<const int16_t*>(collector.bytes.data());
         for (size_t i = 0; i < collector.bytes.size() / 2; ++i) r.samples.push_back(s[i] / 32768.0f);

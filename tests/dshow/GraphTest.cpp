@@ -238,6 +238,24 @@ TEST(Graph, EnvelopeChangesItsParameterAtTheRightSample) {
     }
 }
 
+TEST(Graph, SeekingPassesThroughAndASeekAfterTheEndPlaysOnUntrimmed) {
+    ReverbCore core;
+    core.setValue(kOutputLevelWet, -600);  // dry only: every input frame shows in the output
+    std::vector<unsigned char> state(kCoreStateSize);
+    core.saveState(state.data());
+    GraphResult r = RunGraph(WinePath(CasesDir() + "/dc-silence-44100-f32.wav"), state, nullptr, nullptr, true);
+    ASSERT_EQ(r.hr, S_OK) << r.step;
+    EXPECT_EQ(r.duration, 6000000);  // 0.6 s, from the parser through the output pin's pass-through
+    ASSERT_TRUE(r.completed);
+    // The file is 26460 frames, the second half silent. After the seek it plays whole once more: its
+    // silent blocks are not trimmed away as if they were the tail of the ended stream.
+    EXPECT_EQ(r.firstPassSamples, 2u * 26460);
+    EXPECT_EQ(r.samples.size() - r.firstPassSamples, 2u * 26460);
+    size_t dc = 0;
+    for (size_t i = r.firstPassSamples; i < r.samples.size(); ++i) dc += r.samples[i] == 0.5f;
+    EXPECT_EQ(dc, 2u * 13230);
+}
+
 TEST(Graph, StateSavedFromOneFilterLoadsIntoAFreshOne) {
     ReverbCore core;
     core.setValue(kAlgorithm, 7);

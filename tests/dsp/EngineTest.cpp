@@ -293,6 +293,9 @@ TEST(BlockProcessor, FlushTrimsAtTheLastAudibleFrame) {
     EXPECT_TRUE(e.tailTrimArmed);
     std::fill(s.in.begin(), s.in.end(), 0.0f);
     EXPECT_EQ(s.run(e, 100, 0), 0);  // once latched, every later block is trimmed
+    e.ClearEndOfStream();  // a seek after the end: blocks are whole again
+    EXPECT_EQ(s.run(e, 100, 0), 100);
+    EXPECT_EQ(s.run(e, 100, 1), 0);
     e.ResetState();
     EXPECT_FALSE(e.flushLatched);
     EXPECT_EQ(s.run(e, 100, 0), 100);

@@ -404,6 +404,12 @@ HRESULT ReverbFilter::EndOfStream() {
     }
 }
 
+HRESULT ReverbFilter::EndFlush() {
+    // A flush precedes new data from another position: a stream that had ended plays on untrimmed.
+    control_->GetCore()->resumeAfterFlush();
+    return TransformFilter::EndFlush();
+}
+
 // ---- IPersistStream ----
 
 STDMETHODIMP ReverbFilter::IsDirty() { return control_->IsDirty() ? S_OK : S_FALSE; }

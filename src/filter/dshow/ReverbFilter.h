@@ -84,6 +84,7 @@ public:
     HRESULT CheckInputPinMediaType(const AM_MEDIA_TYPE* mt) override;
     HRESULT Receive(IMediaSample* sample) override;
     HRESULT EndOfStream() override;
+    HRESULT EndFlush() override;
     const wchar_t* FilterName() const override { return L"Morvane Ulvetta"; }
     DWORD FilterMerit() const override { return MERIT_DO_NOT_USE; }
 
