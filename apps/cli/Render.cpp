@@ -78,6 +78,12 @@ int outputContainer(const fs::path& out) {
     return SF_FORMAT_WAV;
 }
 
+// WAV, AIFF and AU describe their sizes in 32 bits; the data must leave room for the header.
+constexpr long long kMaxSmallFileData = 0xFFFFFFFFLL - 4096;
+bool hasSmallSizeFields(int container) {
+    return container == SF_FORMAT_WAV || container == SF_FORMAT_AIFF || container == SF_FORMAT_AU;
+}
+
 // A new file beside the output that becomes the output by a rename; removed unless committed.
 class TempOutput {
 public:
@@ -166,10 +172,19 @@ private:
 
 class OutputWriter {
 public:
-    OutputWriter(SNDFILE* file, bool asFloat, const std::string& name, int blockFrames)
-        : file_(file), asFloat_(asFloat), name_(name), pcm_(asFloat ? 0 : 2 * static_cast<size_t>(blockFrames)) {}
+    OutputWriter(SNDFILE* file, bool asFloat, const std::string& name, int blockFrames, bool smallSizeFields)
+        : file_(file),
+          asFloat_(asFloat),
+          name_(name),
+          pcm_(asFloat ? 0 : 2 * static_cast<size_t>(blockFrames)),
+          maxFrames_(smallSizeFields ? kMaxSmallFileData / (asFloat ? 8 : 4) : INT64_MAX) {}
     void write(const float* interleaved, int frames) {
         if (frames <= 0) return;
+        written_ += frames;
+        if (written_ > maxFrames_)
+            throw CliError("the output " + inQuotes(name_) +
+                               " would outgrow the 4 GiB that its format can describe; name it .w64, .rf64 or .caf",
+                           kExitFailure);
         sf_count_t written;
         if (asFloat_) {
             written = sf_writef_float(file_, interleaved, frames);
@@ -186,6 +201,8 @@ private:
     bool asFloat_;
     std::string name_;
     std::vector<short> pcm_;
+    long long maxFrames_;
+    long long written_ = 0;
 };
 
 // Reads up to frames frames into an interleaved stereo float buffer, converting 16-bit PCM like the
@@ -252,10 +269,11 @@ void render(ReverbCore& core, const RenderRequest& request, bool progress) {
     if (fs::is_directory(outPath, ec)) throw CliError("the output " + inQuotes(request.output) + " is a folder");
 
     const bool asFloat = request.forceFloat || (inInfo.format & SF_FORMAT_SUBMASK) != SF_FORMAT_PCM_16;
+    const int container = outputContainer(outPath);
     SF_INFO outInfo{};
     outInfo.samplerate = inInfo.samplerate;
     outInfo.channels = 2;
-    outInfo.format = outputContainer(outPath) | (asFloat ? SF_FORMAT_FLOAT : SF_FORMAT_PCM_16);
+    outInfo.format = container | (asFloat ? SF_FORMAT_FLOAT : SF_FORMAT_PCM_16);
     if (!sf_format_check(&outInfo))
         throw CliError("the output " + inQuotes(request.output) + " cannot hold this sample format");
 
@@ -272,7 +290,7 @@ void render(ReverbCore& core, const RenderRequest& request, bool progress) {
     const int block = request.blockFrames;
     std::vector<float> in(2 * static_cast<size_t>(block), 0.0f), result(2 * static_cast<size_t>(block), 0.0f);
     InputReader reader(input.get(), inInfo, request.input, block);
-    OutputWriter writer(output.get(), asFloat, request.output, block);
+    OutputWriter writer(output.get(), asFloat, request.output, block, hasSmallSizeFields(container));
     Progress bar(progress, inInfo.frames, inInfo.samplerate);
 
     long long done = 0;
