@@ -122,6 +122,9 @@ TEST_F(CliTest, BadInputExitsTwoAndLeavesNoOutput) {
     zeroRate.replace(24, 8, std::string(8, '\0'));
     std::ofstream(dir_ / "rate0.wav", std::ios::binary) << zeroRate;
     std::ofstream(dir_ / "short.stp", std::ios::binary) << std::string(87, '\0');
+    // A sparse 4 GiB settings file: judged by its size, never read.
+    std::ofstream(dir_ / "huge.stp", std::ios::binary) << std::string(88, '\0');
+    fs::resize_file(dir_ / "huge.stp", uintmax_t(4) << 30);
     std::string wrongGuid(88, '\0');
     wrongGuid[0] = 88;
     std::ofstream(dir_ / "guid.stp", std::ios::binary) << wrongGuid;
@@ -148,6 +151,7 @@ TEST_F(CliTest, BadInputExitsTwoAndLeavesNoOutput) {
         {"render", "in.wav", "out.wav", "--state", "short.stp"},
         {"render", "in.wav", "out.wav", "--state", "guid.stp"},
         {"render", "in.wav", "out.wav", "--state", "none.stp"},
+        {"render", "in.wav", "out.wav", "--state", "huge.stp"},
         {"render", "in.wav", "out.wav", "--block", "0"},
         {"render", "in.wav", "out.wav", "--block=-64"},
         {"render", "in.wav", "out.wav", "--block", "100000000"},
@@ -164,6 +168,22 @@ TEST_F(CliTest, BadInputExitsTwoAndLeavesNoOutput) {
         EXPECT_EQ(listing(), before);
     }
     EXPECT_EQ(slurp(dir_ / "keep.wav"), "previous output");
+}
+
+TEST_F(CliTest, BundledDrySampleRendersThroughAFactoryPreset) {
+    fs::copy_file(ULVETTA_DRY_WAV, dir_ / "dry.wav");
+    EXPECT_LT(fs::file_size(dir_ / "dry.wav"), 1u << 20);
+    const Audio in = read("dry.wav");
+    EXPECT_EQ(in.rate, 44100);
+    EXPECT_EQ(in.format & SF_FORMAT_SUBMASK, SF_FORMAT_PCM_16);
+    EXPECT_GE(in.frames(), 4 * 44100);
+    EXPECT_LE(in.frames(), 6 * 44100);
+    const RunResult r = run({"render", "dry.wav", "out.wav", "--preset", "LARGE ROOM *****", "--block", "1024"});
+    ASSERT_EQ(r.status, 0) << r.err;
+    const Audio out = read("out.wav");
+    EXPECT_EQ(out.channels, 2);
+    EXPECT_GE(out.frames(), in.frames());
+    EXPECT_TRUE(std::all_of(out.floats.begin(), out.floats.end(), [](float v) { return std::isfinite(v); }));
 }
 
 TEST_F(CliTest, RenderReplacesAnExistingOutputOnlyWhenComplete) {

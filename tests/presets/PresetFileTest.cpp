@@ -97,6 +97,8 @@ TEST_F(PresetFolderTest, ListsOnlyRegularFilesHoldingOneValidRecord) {
     writeBytes(dir_ / "Other.txt", good);
     writeBytes(dir_ / "Plainstp", good);
     writeBytes(dir_ / ".stp", good);
+    // A name that could not be saved or loaded here is not offered either.
+    writeBytes(dir_ / "a:b.stp", good);
 
     EXPECT_EQ(sorted(PresetFolder(dir_.string()).list()), (std::vector<std::string>{"Mixed", "Plain", "Upper"}));
 }
