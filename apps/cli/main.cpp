@@ -10,6 +10,7 @@
 #include <string>
 
 #include "CliSetup.h"
+#include "IrReport.h"
 #include "ParamsReport.h"
 #include "Render.h"
 #include "filter/ReverbCore.h"
@@ -98,6 +99,9 @@ int run(int argc, char** argv) {
     remove->add_option("NAME", name, "Preset name")->required();
     for (CLI::App* sub : {list, factory, show, save, remove}) sub->fallthrough();
 
+    // ir
+    auto* ir = app.add_subcommand("ir", "Describe the stored impulse responses of the convolution reverbs");
+
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& e) {
@@ -127,6 +131,11 @@ int run(int argc, char** argv) {
         ReverbCore core;
         paramsSetup.apply(core);
         std::fputs((json ? paramsJson(core) : paramsTable(core)).c_str(), stdout);
+        return kExitOk;
+    }
+
+    if (ir->parsed()) {
+        std::fputs(storedResponsesReport().c_str(), stdout);
         return kExitOk;
     }
 

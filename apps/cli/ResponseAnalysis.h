@@ -1,0 +1,30 @@
+// Measurements of a stereo impulse response: peak, reverberation time per octave band (T30 from
+// Schroeder's backward integration) and the correlation of the two channels' tails.
+#pragma once
+
+#include <cstddef>
+#include <vector>
+
+namespace ulvetta {
+
+struct ResponseReport {
+    size_t frames = 0;
+    double peak = 0.0;
+    // Reverberation time (60 dB, extrapolated from the -5..-35 dB range) in the octaves around 250 Hz,
+    // 1 kHz and 4 kHz; 0 when the band never falls 35 dB.
+    double t60_250 = 0.0, t60_1k = 0.0, t60_4k = 0.0;
+    // Broadband decay in dB per second over the same range.
+    double decayDbPerSecond = 0.0;
+    // Pearson correlation of left and right after the first 80 ms.
+    double tailCorrelation = 0.0;
+};
+
+// left and right hold frames samples each, at rate Hz.
+ResponseReport analyseResponse(const float* left, const float* right, size_t frames, double rate);
+
+// Seconds from the start at which the Schroeder curve of the energy sequence first falls to fromDb and
+// toDb below its start; both negative or zero. Returns false when it never reaches toDb.
+bool schroederSpan(const std::vector<double>& energy, double rate, double fromDb, double toDb, double& tFrom,
+                   double& tTo);
+
+}  // namespace ulvetta
