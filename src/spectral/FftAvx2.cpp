@@ -35,38 +35,43 @@ struct VAvx2 {
         return _mm256_permute_ps(_mm256_permute2f128_ps(a, a, 1), _MM_SHUFFLE(1, 0, 3, 2));
     }
 
-    // First radix-4 stage: two runs of four complex values (residues 0, 2, 1, 3) per iteration, the same
-    // operations as the SSE2 version in each 128-bit half.
+    // A 4 x 4 block of complex values: register i holds row rev(i) of the block.
+    struct Block {
+        R r[4];
+    };
+    static Block loadBlock(const float* in, int top, std::size_t b) {
+        Block k;
+        for (std::size_t i = 0; i < 4; ++i) k.r[i] = _mm256_loadu_ps(in + 2 * ((kRev2[i] << top) | (b << 2)));
+        return k;
+    }
     template <bool Inv>
-    static void firstRadix4(float* x, std::size_t size) {
-        const R mask = Inv ? _mm256_setr_ps(0.0f, 0.0f, -0.0f, 0.0f, 0.0f, 0.0f, -0.0f, 0.0f)
-                           : _mm256_setr_ps(0.0f, 0.0f, 0.0f, -0.0f, 0.0f, 0.0f, 0.0f, -0.0f);
-        for (std::size_t g = 0; g < size; g += 8) {
-            float* p = x + 2 * g;
-            const R q0 = _mm256_loadu_ps(p);      // a0 a2 a1 a3 of run 0
-            const R q1 = _mm256_loadu_ps(p + 8);  // the same of run 1
-            const __m256d r0 = _mm256_castps_pd(_mm256_permute2f128_ps(q0, q1, 0x20));  // a0 a2 | a0' a2'
-            const __m256d r1 = _mm256_castps_pd(_mm256_permute2f128_ps(q0, q1, 0x31));  // a1 a3 | a1' a3'
-            const R u = _mm256_castpd_ps(_mm256_unpacklo_pd(r0, r1));  // a0 a1
-            const R v = _mm256_castpd_ps(_mm256_unpackhi_pd(r0, r1));  // a2 a3
-            const __m256d pl = _mm256_castps_pd(_mm256_add_ps(u, v));  // s0 s2
-            const __m256d mi = _mm256_castps_pd(_mm256_sub_ps(u, v));  // s1 s3
-            const R a = _mm256_castpd_ps(_mm256_unpacklo_pd(pl, mi));  // s0 s1
-            R b = _mm256_castpd_ps(_mm256_unpackhi_pd(pl, mi));        // s2 s3
-            b = _mm256_xor_ps(_mm256_permute_ps(b, _MM_SHUFFLE(2, 3, 1, 0)), mask);
-            const R lo = _mm256_add_ps(a, b);  // X0 X1 | X0' X1'
-            const R hi = _mm256_sub_ps(a, b);  // X2 X3 | X2' X3'
-            _mm256_storeu_ps(p, _mm256_permute2f128_ps(lo, hi, 0x20));
-            _mm256_storeu_ps(p + 8, _mm256_permute2f128_ps(lo, hi, 0x31));
-        }
+    static void emitBlock(const Block& k, float* out, int top, std::size_t b) {
+        R d[4];
+        butterfly4<VAvx2, Inv>(k.r, d);
+        const __m256d t0 = _mm256_unpacklo_pd(_mm256_castps_pd(d[0]), _mm256_castps_pd(d[1]));
+        const __m256d t1 = _mm256_unpackhi_pd(_mm256_castps_pd(d[0]), _mm256_castps_pd(d[1]));
+        const __m256d t2 = _mm256_unpacklo_pd(_mm256_castps_pd(d[2]), _mm256_castps_pd(d[3]));
+        const __m256d t3 = _mm256_unpackhi_pd(_mm256_castps_pd(d[2]), _mm256_castps_pd(d[3]));
+        // Transposed: output row rev(j) holds column j.
+        const R cols[4] = {
+            _mm256_castpd_ps(_mm256_permute2f128_pd(t0, t2, 0x20)),
+            _mm256_castpd_ps(_mm256_permute2f128_pd(t1, t3, 0x20)),
+            _mm256_castpd_ps(_mm256_permute2f128_pd(t0, t2, 0x31)),
+            _mm256_castpd_ps(_mm256_permute2f128_pd(t1, t3, 0x31)),
+        };
+        for (std::size_t j = 0; j < 4; ++j) _mm256_storeu_ps(out + 2 * ((kRev2[j] << top) | (b << 2)), cols[j]);
+    }
+    template <bool Inv>
+    static void bitReverseFirst(const FftTables& t, const float* in, float* out) {
+        bitReverseFirstBlocks<VAvx2, Inv>(t, in, out);
     }
 };
 
-void complexFft(const FftTables& t, float* x, bool inverse) {
-    if (t.m < 8)
-        complexFftT<VScalar>(t, x, inverse);
+void complexFft(const FftTables& t, const float* in, float* out, bool inverse) {
+    if (t.m < 16)
+        complexFftT<VScalar>(t, in, out, inverse);
     else
-        complexFftT<VAvx2>(t, x, inverse);
+        complexFftT<VAvx2>(t, in, out, inverse);
 }
 void splitForward(const FftTables& t, float* x) { splitForwardT<VAvx2>(t, x); }
 void splitInverse(const FftTables& t, float* x, float scale) { splitInverseT<VAvx2>(t, x, scale); }

@@ -49,6 +49,8 @@ struct VScalar {
     static R reverse(R a) { return a; }
     template <bool Inv>
     static void firstRadix4(float* x, std::size_t size);
+    template <bool Inv>
+    static void bitReverseFirst(const FftTables& t, const float* in, float* out);
 };
 
 // The first radix-4 stage (span 1, no twiddles) on `size` complex values in bit-reversed order: each run
@@ -65,6 +67,14 @@ void VScalar::firstRadix4(float* x, std::size_t size) {
         store(p + 2, Inv ? add(s1, r) : sub(s1, r));
         store(p + 6, Inv ? sub(s1, r) : add(s1, r));
     }
+}
+
+template <bool Inv>
+void bitReverseFirstPlain(const FftTables& t, const float* in, float* out);
+
+template <bool Inv>
+void VScalar::bitReverseFirst(const FftTables& t, const float* in, float* out) {
+    bitReverseFirstPlain<Inv>(t, in, out);
 }
 
 // One radix-4 decimation-in-time stage of span L (L >= V::W) over `size` complex values.
@@ -108,39 +118,123 @@ void radix2Stage(float* x, std::size_t m, const float* tw) {
     }
 }
 
+// A radix-4 butterfly without twiddles across four registers holding residues 0, 2, 1, 3 (the order of
+// a bit-reversed run of four); d receives outputs 0, 1, 2, 3.
+template <class V, bool Inv>
+void butterfly4(const typename V::R* c, typename V::R* d) {
+    using R = typename V::R;
+    const R s0 = V::add(c[0], c[1]), s1 = V::sub(c[0], c[1]), s2 = V::add(c[2], c[3]), s3 = V::sub(c[2], c[3]);
+    const R r = V::mulI(s3);
+    d[0] = V::add(s0, s2);
+    d[2] = V::sub(s0, s2);
+    d[1] = Inv ? V::add(s1, r) : V::sub(s1, r);
+    d[3] = Inv ? V::sub(s1, r) : V::add(s1, r);
+}
+
+// The bit-reversal permutation fused with the first radix-4 stage, for log2m >= 4. The index splits
+// into (a: top 2 bits, b: middle, c: low 2 bits) and reverses to (rev c, rev b, rev a): the 4 x 4 block
+// of middle field b lands, transposed, on block rev b. V::transposeRows(in, b, out, rb) loads the four
+// rows of block b in reversed row order (register i = row rev i), and V::emitRows applies the butterfly
+// across those registers (the lanes of the output rows) and stores the transposed result.
+template <class V, bool Inv>
+void bitReverseFirstBlocks(const FftTables& t, const float* in, float* out) {
+    const int top = t.log2m - 2;
+    const std::size_t blocks = std::size_t(1) << (t.log2m - 4);
+    for (std::size_t b = 0; b < blocks; ++b) {
+        const std::size_t rb = t.revQuarter[b] >> 2;
+        if (rb < b) continue;
+        typename V::Block from = V::loadBlock(in, top, b);
+        if (rb == b) {
+            V::template emitBlock<Inv>(from, out, top, b);
+        } else {
+            typename V::Block to = V::loadBlock(in, top, rb);  // both read before either is written
+            V::template emitBlock<Inv>(from, out, top, rb);
+            V::template emitBlock<Inv>(to, out, top, b);
+        }
+    }
+}
+
+constexpr std::size_t kRev2[4] = {0, 2, 1, 3};
+
+// The last radix-4 stage (span M/8) and the radix-2 stage (span M/2) of an odd-log2 transform in one
+// pass: the four outputs of each half at j meet their radix-2 partners while still in registers.
+template <class V, bool Inv>
+void radix4Then2Stage(float* x, std::size_t m, const float* tw4, const float* tw2) {
+    using R = typename V::R;
+    const std::size_t span = m / 8, half = m / 2;
+    for (std::size_t j = 0; j < span; j += V::W) {
+        const float* w = tw4 + (j / 4) * 24 + (j % 4) * 2;
+        const R w1 = V::load(w), w2 = V::load(w + 8), w3 = V::load(w + 16);
+        R y[2][4];
+        for (int h = 0; h < 2; ++h) {
+            const float* p0 = x + 2 * (h * half + j);
+            const R a0 = V::load(p0);
+            const R a2 = V::template cmul<Inv>(V::load(p0 + 2 * span), w2);
+            const R a1 = V::template cmul<Inv>(V::load(p0 + 4 * span), w1);
+            const R a3 = V::template cmul<Inv>(V::load(p0 + 6 * span), w3);
+            const R s0 = V::add(a0, a2), s1 = V::sub(a0, a2), s2 = V::add(a1, a3), s3 = V::sub(a1, a3);
+            const R r = V::mulI(s3);
+            y[h][0] = V::add(s0, s2);
+            y[h][2] = V::sub(s0, s2);
+            y[h][1] = Inv ? V::add(s1, r) : V::sub(s1, r);
+            y[h][3] = Inv ? V::sub(s1, r) : V::add(s1, r);
+        }
+        for (std::size_t q = 0; q < 4; ++q) {
+            const std::size_t pos = j + q * span;
+            const R b = V::template cmul<Inv>(y[1][q], V::load(tw2 + 2 * pos));
+            V::store(x + 2 * pos, V::add(y[0][q], b));
+            V::store(x + 2 * (pos + half), V::sub(y[0][q], b));
+        }
+    }
+}
+
 // Blocks of up to 2^kBlockLog complex values (8 KB) run all their stages while they sit in the
 // first-level cache; larger transforms recurse depth-first, so each level also stays cache-resident.
 constexpr int kBlockLog = 10;
 
+// Every stage after the first radix-4 one (which the bit-reversal pass has done) over 2^sizeLog values.
 template <class V, bool Inv>
-void fftRecursive(const FftTables& t, float* x, int sizeLog) {
+void laterStages(const FftTables& t, float* x, int sizeLog) {
     const std::size_t size = std::size_t(1) << sizeLog;
+    const int stages = sizeLog / 2;
+    const bool odd = (sizeLog & 1) != 0;
     if (sizeLog <= kBlockLog) {
-        const int stages = sizeLog / 2;
-        if (stages > 0) V::template firstRadix4<Inv>(x, size);
-        for (int s = 1; s < stages; ++s) radix4Stage<V, Inv>(x, size, std::size_t(1) << (2 * s), t.radix4Tw[s]);
-        if (sizeLog & 1) radix2Stage<V, Inv>(x, size, t.radix2Tw);
+        const int plain = (odd && stages >= 2) ? stages - 1 : stages;
+        for (int s = 1; s < plain; ++s) radix4Stage<V, Inv>(x, size, std::size_t(1) << (2 * s), t.radix4Tw[s]);
+        if (odd && stages >= 2)
+            radix4Then2Stage<V, Inv>(x, size, t.radix4Tw[stages - 1], t.radix2Tw);
+        else if (odd)
+            radix2Stage<V, Inv>(x, size, t.radix2Tw);
         return;
     }
-    if (sizeLog & 1) {
-        // Only the whole transform has odd size: its last stage is the radix-2 one.
-        const std::size_t half = size / 2;
-        fftRecursive<V, Inv>(t, x, sizeLog - 1);
-        fftRecursive<V, Inv>(t, x + 2 * half, sizeLog - 1);
-        radix2Stage<V, Inv>(x, size, t.radix2Tw);
+    if (odd) {
+        // Only the whole transform has odd size.
+        const std::size_t eighth = size / 8;
+        for (int c = 0; c < 8; ++c) laterStages<V, Inv>(t, x + 2 * c * eighth, sizeLog - 3);
+        radix4Then2Stage<V, Inv>(x, size, t.radix4Tw[stages - 1], t.radix2Tw);
         return;
     }
     const std::size_t quarter = size / 4;
-    for (int c = 0; c < 4; ++c) fftRecursive<V, Inv>(t, x + 2 * c * quarter, sizeLog - 2);
-    radix4Stage<V, Inv>(x, size, quarter, t.radix4Tw[sizeLog / 2 - 1]);
+    for (int c = 0; c < 4; ++c) laterStages<V, Inv>(t, x + 2 * c * quarter, sizeLog - 2);
+    radix4Stage<V, Inv>(x, size, quarter, t.radix4Tw[stages - 1]);
+}
+
+// Bit reversal with the first radix-4 stage, the plain way.
+template <bool Inv>
+void bitReverseFirstPlain(const FftTables& t, const float* in, float* out) {
+    bitReverse(t, in, out);
+    if (t.log2m >= 2) VScalar::firstRadix4<Inv>(out, t.m);
 }
 
 template <class V>
-void complexFftT(const FftTables& t, float* x, bool inverse) {
-    if (inverse)
-        fftRecursive<V, true>(t, x, t.log2m);
-    else
-        fftRecursive<V, false>(t, x, t.log2m);
+void complexFftT(const FftTables& t, const float* in, float* out, bool inverse) {
+    if (inverse) {
+        V::template bitReverseFirst<true>(t, in, out);
+        laterStages<V, true>(t, out, t.log2m);
+    } else {
+        V::template bitReverseFirst<false>(t, in, out);
+        laterStages<V, false>(t, out, t.log2m);
+    }
 }
 
 // Real split of one pair (k, M-k); a and b are the loaded values Z[k] and Z[M-k] (b's lanes reversed).

@@ -6,7 +6,9 @@ namespace spectral {
 
 namespace {
 
-void complexFft(const FftTables& t, float* x, bool inverse) { complexFftT<VScalar>(t, x, inverse); }
+void complexFft(const FftTables& t, const float* in, float* out, bool inverse) {
+    complexFftT<VScalar>(t, in, out, inverse);
+}
 void splitForward(const FftTables& t, float* x) { splitForwardT<VScalar>(t, x); }
 void splitInverse(const FftTables& t, float* x, float scale) { splitInverseT<VScalar>(t, x, scale); }
 void multiplyPairs(const float* src, float* dst, std::size_t pairs) {

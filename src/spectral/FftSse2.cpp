@@ -28,33 +28,48 @@ struct VSse2 {
     static R conj(R a) { return _mm_xor_ps(a, signs(false, true)); }
     static R reverse(R a) { return _mm_shuffle_ps(a, a, _MM_SHUFFLE(1, 0, 3, 2)); }
 
-    // First radix-4 stage: one run of four complex values (residues 0, 2, 1, 3) per iteration.
-    template <bool Inv>
-    static void firstRadix4(float* x, std::size_t size) {
-        const R mask = Inv ? _mm_setr_ps(0.0f, 0.0f, -0.0f, 0.0f) : _mm_setr_ps(0.0f, 0.0f, 0.0f, -0.0f);
-        for (std::size_t g = 0; g < size; g += 4) {
-            float* p = x + 2 * g;
-            const R r0 = _mm_loadu_ps(p);      // a0 a2
-            const R r1 = _mm_loadu_ps(p + 4);  // a1 a3
-            const R u = _mm_movelh_ps(r0, r1);  // a0 a1
-            const R v = _mm_movehl_ps(r1, r0);  // a2 a3
-            const R pl = _mm_add_ps(u, v);      // s0 s2
-            const R mi = _mm_sub_ps(u, v);      // s1 s3
-            const R a = _mm_movelh_ps(pl, mi);  // s0 s1
-            R b = _mm_movehl_ps(mi, pl);        // s2 s3
-            // s3 -> -i s3 (forward) or i s3 (inverse)
-            b = _mm_xor_ps(_mm_shuffle_ps(b, b, _MM_SHUFFLE(2, 3, 1, 0)), mask);
-            _mm_storeu_ps(p, _mm_add_ps(a, b));
-            _mm_storeu_ps(p + 4, _mm_sub_ps(a, b));
+    // A 4 x 4 block of complex values: row i (register pair lo, hi) holds row rev(i) of the block.
+    struct Block {
+        R lo[4], hi[4];
+    };
+    static Block loadBlock(const float* in, int top, std::size_t b) {
+        Block k;
+        for (std::size_t i = 0; i < 4; ++i) {
+            const float* p = in + 2 * ((kRev2[i] << top) | (b << 2));
+            k.lo[i] = _mm_loadu_ps(p);
+            k.hi[i] = _mm_loadu_ps(p + 4);
         }
+        return k;
+    }
+    template <bool Inv>
+    static void emitBlock(const Block& k, float* out, int top, std::size_t b) {
+        R dl[4], dh[4];
+        butterfly4<VSse2, Inv>(k.lo, dl);
+        butterfly4<VSse2, Inv>(k.hi, dh);
+        // Transposed: output row rev(j) holds column j.
+        const R rows[4][2] = {
+            {_mm_movelh_ps(dl[0], dl[1]), _mm_movelh_ps(dl[2], dl[3])},
+            {_mm_movehl_ps(dl[1], dl[0]), _mm_movehl_ps(dl[3], dl[2])},
+            {_mm_movelh_ps(dh[0], dh[1]), _mm_movelh_ps(dh[2], dh[3])},
+            {_mm_movehl_ps(dh[1], dh[0]), _mm_movehl_ps(dh[3], dh[2])},
+        };
+        for (std::size_t j = 0; j < 4; ++j) {
+            float* p = out + 2 * ((kRev2[j] << top) | (b << 2));
+            _mm_storeu_ps(p, rows[j][0]);
+            _mm_storeu_ps(p + 4, rows[j][1]);
+        }
+    }
+    template <bool Inv>
+    static void bitReverseFirst(const FftTables& t, const float* in, float* out) {
+        bitReverseFirstBlocks<VSse2, Inv>(t, in, out);
     }
 };
 
-void complexFft(const FftTables& t, float* x, bool inverse) {
-    if (t.m < 8)
-        complexFftT<VScalar>(t, x, inverse);
+void complexFft(const FftTables& t, const float* in, float* out, bool inverse) {
+    if (t.m < 16)
+        complexFftT<VScalar>(t, in, out, inverse);
     else
-        complexFftT<VSse2>(t, x, inverse);
+        complexFftT<VSse2>(t, in, out, inverse);
 }
 void splitForward(const FftTables& t, float* x) { splitForwardT<VSse2>(t, x); }
 void splitInverse(const FftTables& t, float* x, float scale) { splitInverseT<VSse2>(t, x, scale); }

@@ -49,14 +49,6 @@ FftTables* buildTables(int order) {
     const std::size_t n = m * 2;
     const int stages = log2m / 2;
     const bool radix2 = (log2m & 1) != 0;
-    const int midBits = log2m >= 6 ? log2m - 6 : 0;
-
-    std::size_t pairCount = 0;
-    if (log2m >= 6) {
-        for (std::uint32_t b = 0; b < (1u << midBits); ++b)
-            if (b <= reverseBits(b, midBits)) ++pairCount;
-    }
-
     // Sizes in floats of each array, each rounded up to keep the next one 32-byte aligned.
     std::size_t stageFloats[16] = {};
     std::size_t total = 0;
@@ -67,8 +59,8 @@ FftTables* buildTables(int order) {
     }
     const std::size_t radix2Floats = radix2 ? roundUp8(m) : 0;
     const std::size_t splitFloats = roundUp8(m + 2);
-    const std::size_t pairFloats = roundUp8(pairCount * 2);  // uint32 and float have the same size
-    total += radix2Floats + 2 * splitFloats + pairFloats;
+    const std::size_t revFloats = roundUp8(m / 4);  // uint32 and float have the same size
+    total += radix2Floats + 2 * splitFloats + revFloats;
 
     // The record itself heads the block; the arrays follow, 32-byte aligned.
     const std::size_t headFloats = roundUp8((sizeof(FftTables) + sizeof(float) - 1) / sizeof(float));
@@ -114,19 +106,9 @@ FftTables* buildTables(int order) {
     t->splitFwd = fwd;
     t->splitInv = inv;
     p += 2 * splitFloats;
-    if (pairCount) {
-        auto* pairs = reinterpret_cast<std::uint32_t*>(p);
-        std::size_t i = 0;
-        for (std::uint32_t b = 0; b < (1u << midBits); ++b) {
-            const std::uint32_t r = reverseBits(b, midBits);
-            if (b <= r) {
-                pairs[i++] = b;
-                pairs[i++] = r;
-            }
-        }
-        t->revPairs = pairs;
-        t->revPairCount = pairCount;
-    }
+    auto* rev = reinterpret_cast<std::uint32_t*>(p);
+    for (std::uint32_t j = 0; j < m / 4; ++j) rev[j] = reverseBits(j, log2m - 2);
+    t->revQuarter = rev;
     return t;
 }
 
@@ -136,17 +118,6 @@ void destroyTables(FftTables* t) {
     t->~FftTables();
     alignedFree(block);
 }
-
-inline void copy64(float* dst, const float* src) { std::memcpy(dst, src, 8); }
-
-inline void swap64(float* a, float* b) {
-    float t[2];
-    std::memcpy(t, a, 8);
-    std::memcpy(a, b, 8);
-    std::memcpy(b, t, 8);
-}
-
-constexpr std::uint32_t kRev3[8] = {0, 4, 2, 6, 1, 5, 3, 7};
 
 }  // namespace
 
@@ -169,48 +140,22 @@ void releaseTables(int order) {
     destroyTables(gSlots[order].exchange(nullptr, std::memory_order_acq_rel));
 }
 
-void bitReverseInPlace(const FftTables& t, float* data) {
+void bitReverse(const FftTables& t, const float* in, float* out) {
     const int bits = t.log2m;
-    if (bits < 6) {
-        for (std::uint32_t j = 0; j < t.m; ++j) {
-            const std::uint32_t r = reverseBits(j, bits);
-            if (j < r) swap64(data + 2 * j, data + 2 * std::size_t(r));
-        }
+    if (bits < 2) {
+        if (in != out) std::memcpy(out, in, 2 * t.m * sizeof(float));
         return;
     }
-    // Index = (a: top 3 bits, b: middle, c: low 3 bits); its reverse = (rev c, rev b, rev a). One pair of
-    // middle fields touches 16 cache lines, which stay in the first-level cache.
-    const int top = bits - 3;
-    for (std::size_t p = 0; p < t.revPairCount; ++p) {
-        const std::size_t b = t.revPairs[2 * p], rb = t.revPairs[2 * p + 1];
-        for (std::uint32_t a = 0; a < 8; ++a) {
-            for (std::uint32_t c = 0; c < 8; ++c) {
-                const std::size_t i = (std::size_t(a) << top) | (b << 3) | c;
-                const std::size_t j = (std::size_t(kRev3[c]) << top) | (rb << 3) | kRev3[a];
-                if (b != rb || i < j) swap64(data + 2 * i, data + 2 * j);
-            }
-        }
-    }
-}
-
-void bitReverseCopy(const FftTables& t, const float* in, float* out) {
-    const int bits = t.log2m;
-    if (bits < 6) {
-        for (std::uint32_t j = 0; j < t.m; ++j) copy64(out + 2 * std::size_t(reverseBits(j, bits)), in + 2 * j);
-        return;
-    }
-    const int top = bits - 3;
-    for (std::size_t p = 0; p < t.revPairCount; ++p) {
-        const std::size_t b = t.revPairs[2 * p], rb = t.revPairs[2 * p + 1];
-        for (int twice = 0; twice < (b != rb ? 2 : 1); ++twice) {
-            const std::size_t from = twice ? rb : b, to = twice ? b : rb;
-            for (std::uint32_t c = 0; c < 8; ++c) {
-                for (std::uint32_t a = 0; a < 8; ++a) {
-                    const std::size_t i = (std::size_t(a) << top) | (from << 3) | c;
-                    const std::size_t j = (std::size_t(kRev3[c]) << top) | (to << 3) | kRev3[a];
-                    copy64(out + 2 * j, in + 2 * i);
-                }
-            }
+    static constexpr std::uint32_t rev2[4] = {0, 2, 1, 3};
+    for (std::uint32_t j = 0; j < t.m; ++j) {
+        const std::size_t r = (std::size_t(rev2[j & 3]) << (bits - 2)) | t.revQuarter[j >> 2];
+        if (in != out) {
+            std::memcpy(out + 2 * r, in + 2 * std::size_t(j), 8);
+        } else if (j < r) {
+            float tmp[2];
+            std::memcpy(tmp, out + 2 * std::size_t(j), 8);
+            std::memcpy(out + 2 * std::size_t(j), out + 2 * r, 8);
+            std::memcpy(out + 2 * r, tmp, 8);
         }
     }
 }

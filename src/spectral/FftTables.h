@@ -24,10 +24,10 @@ struct FftTables {
     // Real split, k = 0 .. M/2: forward 0.5 i W_N^k, inverse i conj(W_N^k).
     const float* splitFwd = nullptr;
     const float* splitInv = nullptr;
-    // Bit reversal of the complex index in three fields (top 3 bits, middle, low 3 bits) when log2m >= 6:
-    // pairs (b, reverse(b)) of middle fields with b <= reverse(b).
-    const std::uint32_t* revPairs = nullptr;
-    std::size_t revPairCount = 0;
+    // Bit reversal over log2m - 2 bits of j, 0 <= j < M/4 (log2m >= 2). The reversal of the full index
+    // is (reverse of its low 2 bits) << (log2m - 2) | revQuarter[j >> 2]; the reversal over fewer bits k
+    // is revQuarter[j] >> (log2m - 2 - k).
+    const std::uint32_t* revQuarter = nullptr;
     void* block = nullptr;  // the one allocation holding everything above
 };
 
@@ -36,15 +36,15 @@ const FftTables* acquireTables(int order);
 // Frees the tables of `order` (no transform of that order may be running).
 void releaseTables(int order);
 
-// Permutes the M complex values of data into bit-reversed index order, in place.
-void bitReverseInPlace(const FftTables& t, float* data);
-// out[reverse(j)] = in[j] for the M complex values; in and out do not overlap.
-void bitReverseCopy(const FftTables& t, const float* in, float* out);
+// out[reverse(j)] = in[j] for the M complex values; in == out permutes in place, otherwise they must not
+// overlap. The plain version, for the smallest orders and processors without SIMD.
+void bitReverse(const FftTables& t, const float* in, float* out);
 
 // The arithmetic kernels of one instruction set. All of them work on tables of order >= 2.
 struct FftKernels {
-    // Complex FFT in place over data already in bit-reversed order; `inverse` flips the sign.
-    void (*complexFft)(const FftTables& t, float* data, bool inverse);
+    // Complex FFT of the M values in `in` into `out` (in == out: in place; otherwise no overlap);
+    // `inverse` flips the sign. Includes the bit-reversal permutation.
+    void (*complexFft)(const FftTables& t, const float* in, float* out, bool inverse);
     // Turns the half-length complex spectrum into the real spectrum, RCPerm layout, in place.
     void (*splitForward)(const FftTables& t, float* data);
     // Undoes splitForward and multiplies by scale (a power of two, so it changes no rounding).

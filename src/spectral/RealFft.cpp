@@ -100,16 +100,16 @@ void packToPerm(float* x, std::size_t n) {
     x[1] = nyquist;
 }
 
-// Forward transform of order >= 1 whose input already sits in out (bit-reversed when fromCopy).
-void forwardBody(const FftTables* t, float* out, int order, int flags) {
+// Forward transform of order >= 1 from in to out (in == out: in place).
+void forwardBody(const FftTables* t, const float* in, float* out, int order, int flags) {
     if (order == 1) {
-        const float x0 = out[0], x1 = out[1];
+        const float x0 = in[0], x1 = in[1];
         out[0] = x0 + x1;
         out[1] = x0 - x1;
         return;
     }
     const spectral::FftKernels& k = spectral::activeKernels();
-    k.complexFft(*t, out, false);
+    k.complexFft(*t, in, out, false);
     k.splitForward(*t, out);
     if (flags & FlagOutPack) permToPack(out, t->m * 2);
 }
@@ -138,8 +138,7 @@ void nspsRealFftl(float* samps, int order, int flags) {
     }
     if (!checkDirection(flags, FlagForward, fn) || !checkOutLayout(flags, fn)) return;
     if (order == 0) return;
-    if (t) spectral::bitReverseInPlace(*t, samps);
-    forwardBody(t, samps, order, flags);
+    forwardBody(t, samps, samps, order, flags);
 }
 
 void nspsRealFftlNip(const float* inSamps, float* outSamps, int order, int flags) {
@@ -170,16 +169,7 @@ void nspsRealFftlNip(const float* inSamps, float* outSamps, int order, int flags
         outSamps[0] = inSamps[0];
         return;
     }
-    if (t) {
-        if (inSamps == outSamps)
-            spectral::bitReverseInPlace(*t, outSamps);
-        else
-            spectral::bitReverseCopy(*t, inSamps, outSamps);
-    } else {
-        outSamps[0] = inSamps[0];
-        outSamps[1] = inSamps[1];
-    }
-    forwardBody(t, outSamps, order, flags);
+    forwardBody(t, inSamps, outSamps, order, flags);
 }
 
 void nspsCcsFftl(float* samps, int order, int flags) {
@@ -209,8 +199,7 @@ void nspsCcsFftl(float* samps, int order, int flags) {
     if (flags & FlagInPack) packToPerm(samps, t->m * 2);
     const spectral::FftKernels& k = spectral::activeKernels();
     k.splitInverse(*t, samps, scale);
-    spectral::bitReverseInPlace(*t, samps);
-    k.complexFft(*t, samps, true);
+    k.complexFft(*t, samps, samps, true);
 }
 
 void nspsMpyRCPerm2(const float* src, float* srcDst, int order) {
