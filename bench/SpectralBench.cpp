@@ -39,6 +39,17 @@ void ulvettaPair(benchmark::State& state) {
     }
 }
 
+// The same with the SSE2 kernels, which every x86-64 processor runs.
+void ulvettaSse2Pair(benchmark::State& state) {
+    const ulvetta::spectral::Isa before = ulvetta::spectral::activeIsa();
+    if (!ulvetta::spectral::selectIsa(ulvetta::spectral::Isa::Sse2)) {
+        state.SkipWithError("no SSE2 kernels in this build");
+        return;
+    }
+    ulvettaPair(state);
+    ulvetta::spectral::selectIsa(before);
+}
+
 void fftwPair(benchmark::State& state) {
     const int order = static_cast<int>(state.range(0));
     const int n = 1 << order;
@@ -111,15 +122,14 @@ public:
     void printTable() const {
         std::printf("\nReal FFT pairs (forward + inverse), CPU ns per pair, measured side by side; kernels: %s\n",
                     isaName());
-        std::printf("%8s %12s %12s %12s %10s %10s\n", "points", "ulvetta", "fftw3f", "kissfft", "ulv/fftw",
-                    "kiss/fftw");
+        std::printf("%8s %12s %12s %12s %12s %10s %10s %10s\n", "points", "ulvetta", "ulv-sse2", "fftw3f",
+                    "kissfft", "ulv/fftw", "sse2/fftw", "kiss/fftw");
         for (int order = kMinOrder; order <= kMaxOrder; ++order) {
-            const double u = get("ulvetta", order), f = get("fftw", order), k = get("kiss", order);
+            const double u = get("ulvetta", order), s = get("sse2", order), f = get("fftw", order),
+                         k = get("kiss", order);
             if (u <= 0 || f <= 0) continue;
-            if (k > 0)
-                std::printf("%8d %12.0f %12.0f %12.0f %10.2f %10.2f\n", 1 << order, u, f, k, u / f, k / f);
-            else
-                std::printf("%8d %12.0f %12.0f %12s %10.2f %10s\n", 1 << order, u, f, "-", u / f, "-");
+            std::printf("%8d %12.0f %12.0f %12.0f %12.0f %10.2f %10.2f %10.2f\n", 1 << order, u, s, f, k, u / f,
+                        s / f, k / f);
         }
     }
 
@@ -144,6 +154,7 @@ private:
 int main(int argc, char** argv) {
     for (int order = kMinOrder; order <= kMaxOrder; ++order) {
         benchmark::RegisterBenchmark("ulvetta", ulvettaPair)->Arg(order)->Unit(benchmark::kNanosecond);
+        benchmark::RegisterBenchmark("sse2", ulvettaSse2Pair)->Arg(order)->Unit(benchmark::kNanosecond);
         benchmark::RegisterBenchmark("fftw", fftwPair)->Arg(order)->Unit(benchmark::kNanosecond);
         benchmark::RegisterBenchmark("kiss", kissPair)->Arg(order)->Unit(benchmark::kNanosecond);
     }

@@ -167,7 +167,9 @@ bool isaAvailable(Isa isa) {
     case Isa::Scalar: return true;
 #if defined(ULVETTA_SPECTRAL_X86)
     case Isa::Sse2: return true;
-    case Isa::Avx2: return __builtin_cpu_supports("avx2");
+    case Isa::Avx2:
+        __builtin_cpu_init();  // may run before the runtime's own initialisation
+        return __builtin_cpu_supports("avx2") != 0;
 #endif
     default: return false;
     }

@@ -50,7 +50,7 @@ int nspsFirInit(const float* taps, int tapsLen, const float* dlyVals, FirState* 
     const std::size_t spare = std::max<std::size_t>(dlyLen, 127) + 1;
     state->taps = static_cast<float*>(spectral::alignedAlloc(len * sizeof(float)));
     state->buffer = static_cast<float*>(spectral::alignedAlloc((dlyLen + spare) * sizeof(float)));
-    if (!state->taps || !state->buffer || spare > 0x7fffffff) {
+    if (!state->taps || !state->buffer) {
         freeBuffers(state);
         report(NspStsNoMem, fn, "Allocation failure");
         return 0;
