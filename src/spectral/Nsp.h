@@ -11,18 +11,20 @@
 //     RCPerm:  R[0], R[N/2], R[1], I[1], R[2], I[2], ..., R[N/2-1], I[N/2-1]
 //     RCPack:  R[0], R[1], I[1], ..., R[N/2-1], I[N/2-1], R[N/2]
 //   (order 1: both are R[0], R[1]). RCPerm is the faster layout and the one nspsMpyRCPerm2 multiplies.
-// - Accuracy: results agree with an exact transform to single-precision rounding (the error grows with
-//   the order, about eps * order * the signal's norm). The SSE2 and AVX2 code paths give bit-identical
-//   results; AVX2 is used when the processor and the operating system support it.
-// - Alignment: data need no particular alignment; 32-byte aligned data are a little faster.
-// - Aliasing: nspsRealFftlNip's inSamps and outSamps must either be the same pointer (then it is the
-//   in-place transform) or not overlap at all. nspsMpyRCPerm2's src and srcDst may be the same array
-//   (squares the spectrum) but must not overlap otherwise.
+// - Accuracy: single precision throughout. Each output value lies within 2 eps (order + 1) times the
+//   root-mean-square magnitude of the exact output values (eps = 2^-24); in practice within a quarter of
+//   that. The SSE2 and AVX2 kernels give bit-identical results; AVX2 is chosen at run time
+//   when the processor and the operating system support it. No fused multiply-add is used.
+// - Alignment: data need no particular alignment.
+// - Aliasing: nspsRealFftlNip's inSamps and outSamps are either the same pointer (then it is the
+//   in-place transform) or separate arrays; a partial overlap is refused with NspStsBadArg. The same holds
+//   for nspsMpyRCPerm2's src and srcDst (the same array squares the spectrum).
 //
 // Memory and threads
-// - The first transform of an order (or a call with FlagInitOnly) builds and caches that order's tables;
-//   that call allocates. Afterwards the transforms of that order allocate nothing and take no lock.
-//   Tables stay until FlagRelease is passed for that order.
+// - The first transform of an order >= 2 (or a call with FlagInitOnly, which accepts null data) builds and
+//   caches that order's tables, about 10 bytes per point (2^17 points: 1.1 MB), under a lock; that call
+//   allocates. Afterwards the transforms of that order allocate nothing and take no lock. Tables stay
+//   until FlagRelease is passed for that order. Orders 0 and 1 need no tables.
 // - Any thread may call the transforms at any time, on its own data, including two threads asking for the
 //   same order the first time at once. FlagRelease for an order must not overlap any other call that uses
 //   that order (the caller keeps it apart; the engine never releases).
@@ -68,7 +70,8 @@ enum : int {
 
 // Forward real FFT in place: samps holds N reals on entry and the spectrum on exit.
 // flags: FlagForward plus exactly one of FlagOutPerm / FlagOutPack; or FlagInitOnly / FlagRelease.
-// FlagInverse is not offered here (use nspsCcsFftl): it reports NspStsUnsupported.
+// FlagNoScale has no effect (the forward transform is unscaled). FlagInverse is not offered here (use
+// nspsCcsFftl): it reports NspStsUnsupported.
 void nspsRealFftl(float* samps, int order, int flags);
 
 // The same, reading N reals from inSamps (left unchanged) and writing the spectrum to outSamps.
@@ -104,10 +107,11 @@ const char* nspErrorStr(int status);
 
 // --- Single-rate FIR filter ----------------------------------------------------------------------
 
-// The state of one FIR filter, y[n] = sum_k h[k] x[n - k]. Zero-initialise it (FirState s{}) before its
-// first nspsFirInit. The filter keeps a window of the last tapsLen inputs inside a buffer that has room for
-// `spare` further samples; when the window reaches windowEnd its newest dlyLen samples are moved back to
-// the start. Processing allocates nothing; a state belongs to one thread at a time.
+// The state of one FIR filter, y[n] = sum_k h[k] x[n - k]. A default-constructed state is uninitialised,
+// and so is a copy of an initialised one (its marker names the original). The filter keeps a window of
+// the last tapsLen inputs inside a buffer that has room for `spare` further samples; when the window
+// reaches windowEnd its newest dlyLen samples are moved back to the start. Processing allocates nothing; a state belongs to one thread at a time. Release every
+// initialised state with nspFirFree.
 struct FirState {
     std::int32_t upFactor = 0, upPhase = 0;      // 1 and 0: single rate
     std::int32_t downFactor = 0, downPhase = 0;  // 1 and 0
@@ -126,7 +130,8 @@ struct FirState {
 
 // Sets up state for the taps h[0..tapsLen-1] (null: all zero) and the tapsLen - 1 past inputs dlyVals,
 // oldest first (null: zeros). Releases the state first if it is initialised. Allocates. Returns nonzero on
-// success; on failure reports NspStsBadArg or NspStsNoMem and leaves the state uninitialised.
+// success. A bad argument (NspStsBadArg) leaves the state as it was; a failed allocation (NspStsNoMem)
+// leaves it uninitialised.
 int nspsFirInit(const float* taps, int tapsLen, const float* dlyVals, FirState* state);
 // Loads tapsLen taps h[0..tapsLen-1] (null: all zero). Allocates nothing.
 void nspsFirSetTaps(const float* taps, FirState* state);
