@@ -1,4 +1,4 @@
-// Builds, caches and releases the per-order FFT tables; the bit-reversal permutations; the choice of
+// Builds, caches and releases the per-order FFT tables; the plain bit-reversal permutation; the choice of
 // instruction set.
 #include "spectral/FftTables.h"
 

@@ -1,5 +1,6 @@
 // The transforms, the spectrum product and the FIR filter allocate nothing once their tables and buffers
-// exist. Every global operator new of this test binary is replaced by one that counts while asked to.
+// exist, and report short memory cleanly. Every global operator new of this test binary is replaced by
+// one that counts while asked to and can refuse over-aligned requests (the library's tables and buffers).
 #include <atomic>
 #include <cstdlib>
 #include <new>
@@ -13,10 +14,12 @@ namespace {
 
 std::atomic<bool> gCounting{false};
 std::atomic<int> gAllocations{0};
+std::atomic<bool> gRefuseAligned{false};
 
 void* allocate(std::size_t n, std::size_t align) {
     if (gCounting.load()) gAllocations.fetch_add(1);
     void* p = nullptr;
+    if (align > alignof(std::max_align_t) && gRefuseAligned.load()) return nullptr;
     if (align <= alignof(std::max_align_t)) {
         p = std::malloc(n ? n : 1);
     } else if (posix_memalign(&p, align, n ? n : 1) != 0) {
@@ -108,6 +111,50 @@ TEST(SpectralAllocation, NothingIsAllocatedOnceTablesAndBuffersExist) {
     }
     nspFirFree(&fir);
     EXPECT_TRUE(std::isfinite(sink));
+}
+
+TEST(SpectralAllocation, ShortMemoryIsReportedAndLeavesDataAlone) {
+    CaptureErrors cap;
+    const int order = 13;
+    nspsRealFftl(nullptr, 12, FlagInitOnly);  // the cache's lock exists from here on
+    nspsRealFftl(nullptr, order, FlagRelease);
+    const std::vector<float> orig = randomFloats(std::size_t(1) << order, seed(2200));
+    std::vector<float> x(orig), y(orig.size(), 5.0f);
+    FirState fir;
+    const std::vector<float> taps = randomFloats(64, seed(2300));
+
+    gRefuseAligned.store(true);
+    nspsRealFftl(x.data(), order, FlagForward | FlagOutPerm);
+    Reported r = cap.take();
+    EXPECT_EQ(r.status, NspStsNoMem);
+    EXPECT_EQ(r.routine, "nspsRealFftl");
+    EXPECT_EQ(r.message, "No working Twd memory");
+    nspsRealFftlNip(x.data(), y.data(), order, FlagForward | FlagOutPerm);
+    EXPECT_EQ(cap.take().routine, "nspsRealFftlNip");
+    nspsCcsFftl(x.data(), order, FlagInverse | FlagInPerm);
+    r = cap.take();
+    EXPECT_EQ(r.routine, "nspsCcsFftl");
+    EXPECT_EQ(r.status, NspStsNoMem);
+    EXPECT_EQ(nspsFirInit(taps.data(), 64, nullptr, &fir), 0);
+    r = cap.take();
+    gRefuseAligned.store(false);
+    EXPECT_EQ(r.status, NspStsNoMem);
+    EXPECT_EQ(r.routine, "nspsFirInit");
+    EXPECT_EQ(r.message, "Allocation failure");
+    EXPECT_EQ(fir.initMarker, nullptr);
+    EXPECT_EQ(fir.taps, nullptr);
+    EXPECT_EQ(fir.buffer, nullptr);
+    EXPECT_EQ(x, orig);
+    EXPECT_EQ(y, std::vector<float>(orig.size(), 5.0f));
+
+    // With memory back, the same calls work.
+    nspsRealFftl(x.data(), order, FlagForward | FlagOutPerm);
+    nspsCcsFftl(x.data(), order, FlagInverse | FlagInPerm);
+    for (std::size_t j = 0; j < x.size(); ++j) ASSERT_NEAR(x[j], orig[j], 1e-5);
+    ASSERT_NE(nspsFirInit(taps.data(), 64, nullptr, &fir), 0);
+    EXPECT_EQ(nspsFir(&fir, 1.0f), taps[0]);
+    nspFirFree(&fir);
+    EXPECT_EQ(cap.take().calls, 0);
 }
 
 #endif
