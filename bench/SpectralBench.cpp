@@ -102,6 +102,19 @@ void spectrumProduct(benchmark::State& state) {
     }
 }
 
+// One sample through a 64-tap FIR filter, the engine's direct head of each convolution channel.
+void firSample(benchmark::State& state) {
+    const std::vector<float> taps = noise(64), input = noise(4096);
+    ulvetta::FirState fir;
+    ulvetta::nspsFirInit(taps.data(), 64, nullptr, &fir);
+    std::size_t n = 0;
+    for (auto _ : state) {
+        benchmark::DoNotOptimize(ulvetta::nspsFir(&fir, input[n]));
+        n = (n + 1) & 4095;
+    }
+    ulvetta::nspFirFree(&fir);
+}
+
 // Collects CPU ns per pair by name ("ulvetta/12") while the console reporter prints as usual; a median
 // of repetitions, when asked for, wins over single runs. CPU time, because on a shared machine the wall
 // clock also counts the time other processes held the core.
@@ -158,6 +171,7 @@ int main(int argc, char** argv) {
         benchmark::RegisterBenchmark("fftw", fftwPair)->Arg(order)->Unit(benchmark::kNanosecond);
         benchmark::RegisterBenchmark("kiss", kissPair)->Arg(order)->Unit(benchmark::kNanosecond);
     }
+    benchmark::RegisterBenchmark("fir64", firSample)->Unit(benchmark::kNanosecond);
     benchmark::RegisterBenchmark("product", spectrumProduct)->Arg(10)->Arg(14)->Unit(benchmark::kNanosecond);
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
