@@ -1,0 +1,147 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <vector>
+
+#include "engine/IrResampler.h"
+#include "processing/BiquadSection.h"
+
+using namespace ulvetta;
+
+namespace {
+
+// Interleaved stereo test signal: a fixed pseudo-random sequence on the left, a sine on the right.
+std::vector<float> interleaved(int frames) {
+    std::vector<float> v(2 * frames);
+    uint32_t s = 12345;
+    for (int i = 0; i < frames; ++i) {
+        s = s * 1664525u + 1013904223u;
+        v[2 * i] = static_cast<float>((s >> 8) / 8388608.0 - 1.0);
+        v[2 * i + 1] = static_cast<float>(0.5 * std::sin(i * 0.05));
+    }
+    return v;
+}
+
+std::vector<float> convertChannel(const std::vector<float>& in, int channel, int rate, int64_t tableLimit = 8192) {
+    const int frames = static_cast<int>(in.size() / 2);
+    IrResampler r;
+    r.setTableLimit(tableLimit);
+    r.Setup(rate);
+    const int capacity = static_cast<int>(static_cast<int64_t>(frames) * rate / 44100 + 64);
+    std::vector<float> out(2 * capacity, 0.0f);
+    const int n = r.Run(out.data() + channel, in.data() + channel, frames, capacity);
+    std::vector<float> mono(n);
+    for (int i = 0; i < n; ++i) mono[i] = out[2 * i + channel];
+    return mono;
+}
+
+// Share of the energy above 23 kHz, through four cascaded high-pass sections.
+double shareAbove23k(const std::vector<float>& x, int rate) {
+    std::vector<float> y = x;
+    for (int k = 0; k < 4; ++k) {
+        BiquadSection s;
+        DesignHighPass(s, rate, 23000);
+        ProcessMono(s, y.data(), static_cast<int>(y.size()));
+    }
+    double all = 0.0, high = 0.0;
+    for (size_t i = 0; i < x.size(); ++i) {
+        all += double(x[i]) * x[i];
+        high += double(y[i]) * y[i];
+    }
+    return high / all;
+}
+
+}  // namespace
+
+TEST(IrResampler, RatiosAndTaps) {
+    IrResampler r;
+    struct {
+        int rate;
+        int64_t L, M;
+    } cases[] = {{48000, 160, 147}, {22050, 1, 2}, {96000, 320, 147}, {32000, 320, 441}, {44101, 44101, 44100},
+                 {768000, 2560, 147}};
+    for (auto c : cases) {
+        r.Setup(c.rate);
+        EXPECT_EQ(r.upFactor(), c.L) << c.rate;
+        EXPECT_EQ(r.downFactor(), c.M) << c.rate;
+        EXPECT_EQ(r.taps(), 60);
+    }
+}
+
+TEST(IrResampler, CutoffStaysBelowTheStoredNyquist) {
+    IrResampler r;
+    r.Setup(22050);
+    EXPECT_DOUBLE_EQ(r.cutoff(), 0.5 * 22050 - 89);
+    r.Setup(44100);
+    EXPECT_DOUBLE_EQ(r.cutoff(), 22050 - 89);
+    r.Setup(192000);
+    EXPECT_DOUBLE_EQ(r.cutoff(), 22050 - 89);
+    // Converting up adds no images: the stored data has nothing above 22.05 kHz, and neither has the result.
+    const std::vector<float> in = interleaved(44100);
+    for (int rate : {96000, 192000}) EXPECT_LT(shareAbove23k(convertChannel(in, 0, rate), rate), 0.02) << rate;
+}
+
+TEST(IrResampler, LengthsFollowTheRate) {
+    const std::vector<float> in = interleaved(135168);
+    const size_t n48 = convertChannel(in, 0, 48000).size();
+    EXPECT_NEAR(static_cast<double>(n48), 135168.0 * 48000 / 44100, 2.0);  // about 147120
+    EXPECT_NEAR(static_cast<double>(convertChannel(in, 0, 22050).size()), 135168 / 2.0, 1.0);
+}
+
+TEST(IrResampler, KeepsTheLevelOfASlowSignal) {
+    // A slow sine passes at the converter's gain of 0.9 at any rate.
+    const std::vector<float> in = interleaved(20000);
+    for (int rate : {22050, 48000, 88200}) {
+        const std::vector<float> out = convertChannel(in, 1, rate);
+        float peak = 0.0f;
+        for (size_t i = out.size() / 4; i < out.size(); ++i) peak = std::max(peak, std::fabs(out[i]));
+        EXPECT_NEAR(peak, 0.45, 0.01) << rate;
+    }
+}
+
+TEST(IrResampler, HalfwayPhaseAt88200) {
+    // L = 2, M = 1: output 2k lands on input k - 29 (the kernel's centre), output 2k + 1 halfway between
+    // inputs k - 29 and k - 28; both at the converter's gain of 0.9.
+    const double w = 2.0 * 3.141592653589793 * 1000.0 / 44100.0;
+    std::vector<float> in(2 * 600, 0.0f);
+    for (int i = 0; i < 600; ++i) in[2 * i] = static_cast<float>(std::sin(w * i));
+    const std::vector<float> out = convertChannel(in, 0, 88200);
+    for (int k = 100; k < 500; ++k) {
+        EXPECT_NEAR(out[2 * k], 0.9 * std::sin(w * (k - 29)), 0.01) << k;
+        EXPECT_NEAR(out[2 * k + 1], 0.9 * std::sin(w * (k - 28.5)), 0.01) << k;
+    }
+}
+
+TEST(IrResampler, ChannelsConvertIndependentlyOnOneBuffer) {
+    const std::vector<float> in = interleaved(5000);
+    IrResampler left, right;
+    left.Setup(48000);
+    right.Setup(48000);
+    std::vector<float> out(2 * 6000, 0.0f);
+    const int nl = left.Run(out.data(), in.data(), 5000, 6000);
+    const int nr = right.Run(out.data() + 1, in.data() + 1, 5000, 6000);
+    ASSERT_EQ(nl, nr);
+    const std::vector<float> l = convertChannel(in, 0, 48000), r = convertChannel(in, 1, 48000);
+    for (int i = 0; i < nl; ++i) {
+        ASSERT_EQ(out[2 * i], l[i]);
+        ASSERT_EQ(out[2 * i + 1], r[i]);
+    }
+}
+
+TEST(IrResampler, RowsDerivedOnUseEqualTheTable) {
+    const std::vector<float> in = interleaved(3000);
+    for (int rate : {48000, 44101}) {
+        const std::vector<float> table = convertChannel(in, 0, rate, 1 << 20);
+        const std::vector<float> derived = convertChannel(in, 0, rate, 0);
+        ASSERT_EQ(table, derived) << rate;
+    }
+}
+
+TEST(IrResampler, NeverWritesPastItsCapacity) {
+    const std::vector<float> in = interleaved(1000);
+    IrResampler r;
+    r.Setup(96000);
+    std::vector<float> out(2 * 100 + 2, 7.0f);
+    EXPECT_EQ(r.Run(out.data(), in.data(), 1000, 100), 100);
+    EXPECT_EQ(out[200], 7.0f);
+}
