@@ -2,6 +2,7 @@
 #include <cmath>
 
 #include "engine/ReverbEngine.h"
+#include "engine/StoredResponses.h"
 
 namespace ulvetta {
 
@@ -36,10 +37,11 @@ void ReverbEngine::Recalculate() {
     const int r = sampleRate;
     const int R = roomSize;
 
+    // Every worker stops before anything it uses is rebuilt.
+    StopWorkers();
     if (mode == 3 || mode == 4 || mode == 5) {
-        // The convolution modes prepare a stored response; until that exists they carry no network.
-        partitionCount = 0;
-        irLength = 0;
+        const StoredResponse stored = storedResponse(mode);
+        PrepareImpulse(stored.count, stored.frames);
         return;
     }
 
@@ -60,6 +62,7 @@ void ReverbEngine::Recalculate() {
         return;
     }
 
+    partitions.reset();
     partitionCount = 0;
     if (mode == 0) {
         lines = 16;

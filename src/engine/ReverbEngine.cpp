@@ -16,9 +16,19 @@ constexpr double kDampingScale = 0.009999999776482582;  // 0.01f
 int roundHalfAway(double v) { return static_cast<int>(std::round(v)); }
 }  // namespace
 
-ReverbEngine::ReverbEngine() = default;
+ReverbEngine::ReverbEngine() {
+    // The convolution's direct head: 64 taps, all zero until a response is prepared.
+    nspsFirInit(nullptr, 64, nullptr, &firLeft);
+    nspsFirInit(nullptr, 64, nullptr, &firRight);
+}
 
-ReverbEngine::~ReverbEngine() = default;
+ReverbEngine::~ReverbEngine() {
+    // Workers are joined before any buffer they use goes.
+    StopWorkers();
+    partitions.reset();
+    nspFirFree(&firLeft);
+    nspFirFree(&firRight);
+}
 
 void ReverbEngine::SetDiffusion(int v) {
     if (v == diffusion) return;
@@ -165,6 +175,15 @@ void ReverbEngine::ResetState() {
     std::fill(std::begin(smoothState), std::end(smoothState), 0.0f);
     for (DelayLine& l : delayLines) l.Zero();
     for (DelayLine& l : earlyLines) l.Zero();
+    historyLeft.Zero();
+    historyRight.Zero();
+    for (int32_t i = 1; i < partitionCount && partitions; ++i) {
+        ConvPartition& p = partitions[i];
+        std::fill(p.inputLeft.get(), p.inputLeft.get() + 2 * p.size, 0.0f);
+        std::fill(p.inputRight.get(), p.inputRight.get() + 2 * p.size, 0.0f);
+    }
+    nspsFirSetDlyl(nullptr, &firLeft);
+    nspsFirSetDlyl(nullptr, &firRight);
 }
 
 }  // namespace ulvetta

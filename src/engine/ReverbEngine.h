@@ -13,7 +13,9 @@
 #include <memory>
 
 #include "processing/BiquadSection.h"
+#include "processing/ConvPartition.h"
 #include "processing/DelayLine.h"
+#include "spectral/Nsp.h"
 
 namespace ulvetta {
 
@@ -62,6 +64,12 @@ public:
     void UpdateNotch();
     // Rebuilds and silences the engine at stream start.
     void ResetState();
+    // Prepares a stored response (frames interleaved stereo frames at 44100 Hz) for the convolution modes:
+    // rate conversion, shortening, damping, fade, room envelope, partitions with their spectra and workers,
+    // the FIR head and the history rings (allocates).
+    void PrepareImpulse(int frames, const float* table);
+    // Stops the worker of every partition (before anything they use is freed or rebuilt).
+    void StopWorkers();
     // Forgets that the stream had ended (the flush latch and the tail trimming), keeping the sound: a
     // seek after the end of a stream plays on without its blocks being trimmed.
     void ClearEndOfStream();
@@ -116,9 +124,19 @@ public:
     float smoothCoefs[5] = {0, 0, 0, 0, 0};  // b0, b1, b2, a1, a2
     float smoothState[4] = {0, 0, 0, 0};     // x1, x2, y1, y2
     int32_t meterSource = 0;                 // 0 input, 1 output, 2 wet
-    int32_t partitionCount = 0;
+    std::unique_ptr<float[]> irLeft, irRight;  // the prepared response, irLength samples each
+    HistoryRing historyLeft, historyRight;       // the convolution's input history
+    float headLeft = 0.0f, headRight = 0.0f;     // latest outputs of the direct FIR head
+    FirState firLeft, firRight;                  // the response's first 64 samples, applied directly
+    int32_t partitionCount = 0;                  // records in partitions, the head (record 0) included
     int32_t irLength = 0;
     int32_t convCounter = 0;
+    int32_t tailCountdown = 0;  // frames of convolution tail still owed after the first flush block
+    // Run the jobs of large partitions on the streaming thread instead of their workers (for tests;
+    // the output is the same).
+    bool inlineLargePartitions = false;
+    // Declared after the buffers it reads: destroyed (and its workers joined) first.
+    std::unique_ptr<ConvPartition[]> partitions;
 
     // Number of rebuilds that got past the unset-value guard (for tests and diagnostics).
     int32_t rebuildCount = 0;
@@ -147,6 +165,8 @@ private:
 
     int processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                      int stride, int accumulate, int flush);
+    int processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                           int stride, int accumulate, int flush);
 
     // Running peak of the wet meter within the current block.
     float wetPeak_ = 0.0f;

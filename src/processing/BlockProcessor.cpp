@@ -137,6 +137,8 @@ int ReverbEngine::trimmedLength(const float* outLeft, const float* outRight, int
 
 int ReverbEngine::ProcessBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                int frames, int stride, int accumulate, int flush) {
+    if (mode == 3 || mode == 4 || mode == 5)
+        return processConvolution(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
     return processPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
 }
 

@@ -1,0 +1,131 @@
+// The convolution kernel of modes 3, 4 and 5: true stereo, each channel convolved with its own response
+// channel without added delay. The first 64 taps run as a direct FIR; partitions of doubling size are
+// convolved by FFT once per their own size, at a schedule that plays every response sample at its exact
+// distance. Partitions of 4096 samples and more are handed to their worker threads.
+#include <algorithm>
+#include <cmath>
+
+#include "engine/ReverbEngine.h"
+
+namespace ulvetta {
+
+namespace {
+
+inline double finiteOr0(float v) { return std::isfinite(v) ? v : 0.0; }
+
+// One sample through a filter section with its left state (the kernel runs both channels through it).
+inline double sectionStep(BiquadSection& s, double x) {
+    const double y = s.b0 * x + s.b1 * s.x1L + s.b2 * s.x2L - s.a1 * s.y1L - s.a2 * s.y2L;
+    s.x2L = s.x1L;
+    s.x1L = x;
+    s.y2L = s.y1L;
+    s.y1L = y;
+    return y;
+}
+
+constexpr int32_t kWorkerPartition = 4096;
+
+}  // namespace
+
+int ReverbEngine::processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                                     int frames, int stride, int accumulate, int flush) {
+    if (frames > 0) {
+        decayMeter(frames);
+        if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
+    }
+    if (flush && !flushLatched) {
+        flushLatched = true;
+        tailCountdown = std::max(0, irLength - 1);
+    }
+    if (frames <= 0) return 0;
+    const bool ready = partitions != nullptr && irLeft != nullptr && historyLeft.count > 0;
+    float wetPeak = 0.0f;
+    for (int i = 0; i < frames; ++i) {
+        const int at = i * stride;
+        double wetLeft = 0.0, wetRight = 0.0;
+        if (ready) {
+            // 1-3. Gain, the input sections and the colour low-pass, one state run over left then right.
+            double xl = finiteOr0(inLeft[at]) * inputGain, xr = finiteOr0(inRight[at]) * inputGain;
+            for (int s = 0; s < 3; ++s) xl = sectionStep(filterSections[s], xl);
+            for (int s = 0; s < 3; ++s) xr = sectionStep(filterSections[s], xr);
+            double cl = xl, cr = xr;
+            if (colour != 100) {
+                cl = (xl - colourState) * colourCutoff + colourState;
+                cr = (xr - cl) * colourCutoff + cl;
+                colourState = cr;
+            }
+            // 4-5. History and the direct head.
+            historyLeft.Push(static_cast<float>(cl));
+            historyRight.Push(static_cast<float>(cr));
+            headLeft = nspsFir(&firLeft, static_cast<float>(cl));
+            headRight = nspsFir(&firRight, static_cast<float>(cr));
+            // 6. Partitions due at this frame take a new window and hand over their last result.
+            const int32_t n = convCounter;
+            if (n != 0 && n % 32 == 0) {
+                for (int32_t k = 1; k < partitionCount; ++k) {
+                    ConvPartition& p = partitions[k];
+                    if ((n / 32) % (p.size / 32) != 0 || p.offset > n) continue;
+                    const bool worker = p.size >= kWorkerPartition && p.HasWorker();
+                    if (worker) p.WaitDone();
+                    const int32_t N = p.size;
+                    std::copy(p.nextLeft.get(), p.nextLeft.get() + N, p.outputLeft.get());
+                    std::copy(p.nextRight.get(), p.nextRight.get() + N, p.outputRight.get());
+                    std::copy(p.inputLeft.get() + N, p.inputLeft.get() + 2 * N, p.inputLeft.get());
+                    std::copy(p.inputRight.get() + N, p.inputRight.get() + 2 * N, p.inputRight.get());
+                    // Frames n - offset .. n - offset + N - 1, oldest first; frame n is the newest in the ring.
+                    for (int32_t j = 0; j < N; ++j) {
+                        const int32_t age = p.offset - j;
+                        p.inputLeft[N + j] = historyLeft.Back(age);
+                        p.inputRight[N + j] = historyRight.Back(age);
+                    }
+                    if (worker)
+                        p.StartJob();
+                    else
+                        p.RunJob();
+                }
+            }
+            // 7-8. The counter, then the output of the head and every partition.
+            ++convCounter;
+            wetLeft = headLeft;
+            wetRight = headRight;
+            for (int32_t k = 1; k < partitionCount; ++k) {
+                ConvPartition& p = partitions[k];
+                wetLeft += p.outputLeft[p.readPos];
+                wetRight += p.outputRight[p.readPos];
+                if (++p.readPos == p.size) p.readPos = 0;
+            }
+        }
+        // 9-10. Wet meter and mix.
+        if (meterSource == 2)
+            wetPeak = std::max(wetPeak, smooth(static_cast<float>(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetLevel)));
+        const float l = static_cast<float>(wetLeft * wetLevel + finiteOr0(inLeft[at]) * dryLevel);
+        const float r = static_cast<float>(wetRight * wetLevel + finiteOr0(inRight[at]) * dryLevel);
+        if (accumulate) {
+            outLeft[at] += l;
+            outRight[at] += r;
+        } else {
+            outLeft[at] = l;
+            outRight[at] = r;
+        }
+    }
+    if (meterSource == 2) {
+        raiseLevel(wetPeak);
+        cleanSmoothState();
+    }
+    // Keep denormals out of the recursive states.
+    colourState = flushTiny(colourState);
+    for (int s = 0; s < 3; ++s) {
+        BiquadSection& f = filterSections[s];
+        f.x1L = flushTiny(f.x1L);
+        f.x2L = flushTiny(f.x2L);
+        f.y1L = flushTiny(f.y1L);
+        f.y2L = flushTiny(f.y2L);
+    }
+    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
+    if (!flush) return frames;
+    const int produced = std::min(frames, tailCountdown);
+    tailCountdown -= produced;
+    return produced;
+}
+
+}  // namespace ulvetta
