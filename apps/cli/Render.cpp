@@ -326,4 +326,33 @@ void render(ReverbCore& core, const RenderRequest& request, bool progress) {
     temp.commit();
 }
 
+void exportResponse(ReverbCore& core, int rate, const std::string& path) {
+    if (rate < kMinSampleRate || rate > kMaxSampleRate)
+        throw CliError("--rate takes a sample rate from " + std::to_string(kMinSampleRate) + " to " +
+                       std::to_string(kMaxSampleRate) + " Hz");
+    const int algorithm = core.getValue(kAlgorithm);
+    if (algorithm < 3 || algorithm > 5)
+        throw CliError("algorithm " + std::to_string(algorithm) + " (" + kAlgorithmNames[algorithm] +
+                       ") is not a convolution reverb; choose 3, 4 or 5");
+    core.setFormat(static_cast<float>(rate), 0, 2, 2);
+    core.applyAll();
+    const ReverbEngine& engine = core.engineForInspection();
+    SF_INFO info{};
+    info.samplerate = rate;
+    info.channels = 2;
+    info.format = SF_FORMAT_WAV | SF_FORMAT_FLOAT;
+    TempOutput temp{fs::path(path)};
+    SndfilePtr out(sf_open_fd(temp.release(), SFM_WRITE, &info, SF_TRUE));
+    if (!out) throw CliError("cannot write " + inQuotes(path) + " (" + sndfileMessage(nullptr) + ")", kExitFailure);
+    std::vector<float> frames(2 * static_cast<size_t>(engine.irLength));
+    for (int32_t i = 0; i < engine.irLength; ++i) {
+        frames[2 * i] = engine.irLeft[i];
+        frames[2 * i + 1] = engine.irRight[i];
+    }
+    if (sf_writef_float(out.get(), frames.data(), engine.irLength) != engine.irLength)
+        throw CliError("writing " + inQuotes(path) + " failed", kExitFailure);
+    if (sf_close(out.release()) != 0) throw CliError("finishing " + inQuotes(path) + " failed", kExitFailure);
+    temp.commit();
+}
+
 }  // namespace ulvetta

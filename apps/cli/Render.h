@@ -33,6 +33,12 @@ struct RenderRequest {
 // behind. Throws CliError. progress: draw a progress bar on stderr once the render has run a second.
 void render(ReverbCore& core, const RenderRequest& request, bool progress);
 
+// Writes the response that the core's engine has prepared for a convolution algorithm (both channels,
+// zero tail included) to path as a stereo 32-bit float WAV at the stream rate, through a temporary file.
+// The core must hold its settings; this sets the format to rate, applies everything and exports.
+// Throws CliError for a non-convolution algorithm or a bad rate.
+void exportResponse(ReverbCore& core, int rate, const std::string& path);
+
 // Converts one float output sample to 16-bit PCM like the filter: x 32768, truncated toward zero,
 // clamped to -32768..32767 (NaN gives 0).
 short floatToPcm16(float v);

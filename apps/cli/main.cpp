@@ -100,7 +100,14 @@ int run(int argc, char** argv) {
     for (CLI::App* sub : {list, factory, show, save, remove}) sub->fallthrough();
 
     // ir
-    auto* ir = app.add_subcommand("ir", "Describe the stored impulse responses of the convolution reverbs");
+    auto* ir = app.add_subcommand(
+        "ir", "Describe the stored impulse responses, or export the response an algorithm prepares (OUT.wav)");
+    CoreSetup irSetup;
+    irSetup.attach(*ir);
+    std::string irOut;
+    std::string irRate = "44100";
+    ir->add_option("OUT", irOut, "Write the prepared response of --algorithm 3, 4 or 5 here as a float WAV");
+    ir->add_option("--rate", irRate, "Stream rate in Hz for the export (default 44100)")->type_name("HZ");
 
     try {
         app.parse(argc, argv);
@@ -135,7 +142,18 @@ int run(int argc, char** argv) {
     }
 
     if (ir->parsed()) {
-        std::fputs(storedResponsesReport().c_str(), stdout);
+        if (irOut.empty()) {
+            std::fputs(storedResponsesReport().c_str(), stdout);
+            return kExitOk;
+        }
+        long long rate = 0;
+        if (!parseInteger(irRate, kMinSampleRate, kMaxSampleRate, rate))
+            throw CliError("--rate takes a sample rate from " + std::to_string(kMinSampleRate) + " to " +
+                           std::to_string(kMaxSampleRate) + " Hz, not \"" + irRate + "\"");
+        irSetup.collect(*ir);
+        ReverbCore core;
+        irSetup.apply(core);
+        exportResponse(core, static_cast<int>(rate), irOut);
         return kExitOk;
     }
 
