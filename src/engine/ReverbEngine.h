@@ -107,7 +107,7 @@ public:
     DelayLine earlyLines[kEarlyLines];
     PreDelayLine preDelayLine;
     std::unique_ptr<float[]> monoBuffer;
-    int32_t monoCapacity = 0;  // frames
+    int32_t monoCapacity = 0;  // floats: one per frame (mono), two per frame in the stereo echo
     bool flushLatched = false;
     bool tailTrimArmed = false;
     float smoothCoefs[5] = {0, 0, 0, 0, 0};  // b0, b1, b2, a1, a2
@@ -125,8 +125,9 @@ private:
     // stays stable at any rate while the parameter keeps the value the user set.
     int designLimit(int hz) const;
 
-    // Pieces of the per-block frame shared by the kernels.
-    void latchFlush(int flush);
+    // Pieces of the per-block frame shared by the kernels. preDelayInPath: the kernel writes the pre-delay
+    // line, so the end-of-stream tail cannot end while it still holds signal.
+    void latchFlush(int flush, bool preDelayInPath);
     void decayMeter(int frames);
     void meterInput(const float* inLeft, const float* inRight, int frames, int stride);
     void makeMono(const float* inLeft, const float* inRight, int frames, int stride);
@@ -142,8 +143,19 @@ private:
     void raiseLevel(float peak);
     void cleanSmoothState();
 
+    // Grows the scratch buffer to hold at least count floats; returns it.
+    float* growScratch(int32_t count);
+
+    // The kernels: one block each, inside the block frame (input stage, mix, meters, tail trimming).
+    // processDry runs the frame with a silent wet signal, for a mode whose network does not exist (yet).
     int processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                      int stride, int accumulate, int flush);
+    int processExtendedPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                             int frames, int stride, int accumulate, int flush);
+    int processEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                    int stride, int accumulate, int flush);
+    int processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                   int stride, int accumulate, int flush);
 
     // Running peak of the wet meter within the current block.
     float wetPeak_ = 0.0f;

@@ -47,10 +47,16 @@ void ReverbEngine::cleanSmoothState() {
         if (exponentIsZero(s)) s = 0.0f;
 }
 
-void ReverbEngine::latchFlush(int flush) {
+void ReverbEngine::latchFlush(int flush, bool preDelayInPath) {
     if (!flushLatched) flushLatched = (flush != 0);
     if (!flushLatched) return;
+    // A line out of the signal path is never written again, so whatever it still holds (from before
+    // "Pre Delay" went to 0, or from the echo of another mode) would hold the tail open forever.
     bool silent = true;
+    if (!preDelayInPath) {
+        tailTrimArmed = true;
+        return;
+    }
     for (int32_t i = 0; i < preDelayLine.length && silent; ++i) {
         const double v = preDelayLine.samples[i];
         silent = (v >= -kTiny && v <= kTiny);
@@ -76,17 +82,23 @@ void ReverbEngine::meterInput(const float* inLeft, const float* inRight, int fra
     cleanSmoothState();
 }
 
-void ReverbEngine::makeMono(const float* inLeft, const float* inRight, int frames, int stride) {
-    if (monoCapacity < frames) {
+float* ReverbEngine::growScratch(int32_t count) {
+    if (monoCapacity < count) {
+        // The old buffer goes first, so that the peak footprint stays one buffer.
         monoBuffer.reset();
-        monoBuffer.reset(new float[frames]);
-        monoCapacity = frames;
+        monoBuffer.reset(new float[count]);
+        monoCapacity = count;
     }
+    return monoBuffer.get();
+}
+
+void ReverbEngine::makeMono(const float* inLeft, const float* inRight, int frames, int stride) {
+    float* mono = growScratch(frames);
     const float gain = static_cast<float>(inputGain);
     for (int i = 0; i < frames; ++i) {
         const float l = finiteOrZero(inLeft[i * stride]);
         const float r = finiteOrZero(inRight[i * stride]);
-        monoBuffer[i] = (l + r) * 0.5f * gain;
+        mono[i] = (l + r) * 0.5f * gain;
     }
 }
 
@@ -137,28 +149,34 @@ int ReverbEngine::trimmedLength(const float* outLeft, const float* outRight, int
 
 int ReverbEngine::ProcessBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                int frames, int stride, int accumulate, int flush) {
-    return processPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    switch (mode) {
+        case 7:
+            return processEcho(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+        case 2:
+        case 6:
+            return processExtendedPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+        case 3:
+        case 4:
+        case 5:
+            // The convolution kernel is not part of this build yet: these modes pass the dry signal.
+            return processDry(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+        default:
+            return processPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    }
 }
 
-int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
-                               int frames, int stride, int accumulate, int flush) {
-    latchFlush(flush);
+int ReverbEngine::processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                             int frames, int stride, int accumulate, int flush) {
+    latchFlush(flush, false);
     if (frames <= 0) return 0;
     decayMeter(frames);
     if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    makeMono(inLeft, inRight, frames, stride);
-    filterMono(frames);
     wetPeak_ = 0.0f;
-    for (int i = 0; i < frames; ++i) {
-        // The plate network is not wired yet: the wet signal is silent.
-        const double wetLeft = 0.0, wetRight = 0.0;
-        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
-    }
+    for (int i = 0; i < frames; ++i) mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, 0.0, 0.0);
     if (meterSource == 2) {
         raiseLevel(wetPeak_);
         cleanSmoothState();
     }
-    flushKernelStates();
     if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);
 }

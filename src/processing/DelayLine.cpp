@@ -34,6 +34,9 @@ void Modulator::Update() {
     const double r = sampleRate / rate;
     // The nearest integer to r + 0.5 with ties to even: a fractional period is rounded up.
     period = static_cast<int32_t>(r > -0.5 ? std::nearbyint(r + 0.5) : std::nearbyint(r - 0.5));
+    // A rate that is not set up yet (0 Hz sample rate) must not give an empty period: the phase would
+    // leave its range and the excursion would be undefined.
+    period = std::max<int32_t>(period, 1);
     periodLength = period;
     phase = std::min(phase, period - 1);
 }
