@@ -39,12 +39,19 @@ void Modulator::Update() {
     period = std::max<int32_t>(period, 1);
     periodLength = period;
     phase = std::min(phase, period - 1);
+    sinePhase_ = -1;
 }
 
-double Modulator::Tick() {
-    const double m = depth * std::sin(3.141592653589793 * phase / periodLength);
-    if (++phase >= period) phase = 0;
-    return m;
+void Modulator::Resync() {
+    constexpr double kPi = 3.141592653589793;
+    const double angle = kPi * phase / periodLength;
+    sine_ = std::sin(angle);
+    cosine_ = std::cos(angle);
+    stepSin_ = std::sin(kPi / periodLength);
+    stepCos_ = std::cos(kPi / periodLength);
+    sinePhase_ = phase;
+    // Restart exactly at every wrap to phase 0, and at least every kResyncInterval samples.
+    untilResync_ = std::min(kResyncInterval, period - phase);
 }
 
 void DelayLine::ConfigureLine(int sampleRate, int roomSize, int baseLength, double g, int depth, double rate,

@@ -35,26 +35,31 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
     }
     for (int s = 0; s < 3; ++s) ProcessInterleaved(filterSections[s], scratch, frames);
 
-    DelayLine* lines = delayLines;
+    NetworkViews v;
+    v.Load(*this, 12, 14, false);
+    LineView* lines = v.lines;
+    OutputTap* taps = v.taps;
     double* echo = preDelayLine.samples.get();
     const int32_t echoLength = preDelayLine.length;
     int32_t k = preDelayLine.writeIndex;
     const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, feedback = echoFeedback;
+    const double cutoff = colourCutoff;
+    double colourL = colourState, colourR = colourState2, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     wetPeak_ = 0.0f;
     for (int i = 0; i < frames; ++i) {
         int32_t k1 = k + 1;
         if (k1 >= echoLength) k1 -= echoLength;
-        const double cL = ColourStep(colourState, echo[k], colourCutoff);
-        const double cR = ColourStep(colourState2, echo[k1], colourCutoff);
+        const double cL = ColourStep(colourL, echo[k], cutoff);
+        const double cR = ColourStep(colourR, echo[k1], cutoff);
 
         const double q = Diffuse(lines, (cL + cR) * dc);
         const double u = decayK * Oldest(lines[11]) + q;
-        WriteOnly(lines[7], TankHalf(lines, 4, u, false, dc, decayK, dampK, dampingStateLeft));
+        WriteOnly(lines[7], TankHalf(lines, 4, u, false, dc, decayK, dampK, dampLeft));
         const double u2 = decayK * Oldest(lines[7]) + q;
-        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampingStateRight));
-        for (int t = 0; t < 14; ++t) StepTap(outputTaps[t]);
-        const double tankLeft = PlateTapsLeft(lines, outputTaps);
-        const double tankRight = PlateTapsRight(lines, outputTaps);
+        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
+        for (int t = 0; t < 14; ++t) StepTap(taps[t]);
+        const double tankLeft = PlateTapsLeft(lines, taps);
+        const double tankRight = PlateTapsRight(lines, taps);
 
         echo[k] = scratch[2 * i] + feedback * (cL + kCrossFeed * cR);
         k = k1;
@@ -63,7 +68,12 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
 
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, tankLeft + cL, tankRight + cR);
     }
+    v.Store(*this);
     preDelayLine.writeIndex = k;
+    colourState = colourL;
+    colourState2 = colourR;
+    dampingStateLeft = dampLeft;
+    dampingStateRight = dampRight;
     if (meterSource == 2) {
         raiseLevel(wetPeak_);
         cleanSmoothState();

@@ -20,37 +20,43 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
     makeMono(inLeft, inRight, frames, stride);
     filterMono(frames);
 
-    DelayLine* lines = delayLines;
-    DelayLine* early = earlyLines;
-    const OutputTap* taps = outputTaps;
+    NetworkViews v;
+    v.Load(*this, 20, 20, true);
+    LineView* lines = v.lines;
+    LineView* early = v.early;
+    OutputTap* taps = v.taps;
+    PreDelayView pre = ViewOf(preDelayLine);
+    const bool usePreDelay = preDelayOn && pre.length > 0;
     const bool crossfade = (diffusion != 100);
     const bool weighted = (mode == 6);
-    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef;
-    const bool usePreDelay = preDelayOn && preDelayLine.length > 0;
+    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, cutoff = colourCutoff;
+    const double eGain = earlyGain;
+    double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
+    const float* mono = monoBuffer.get();
     wetPeak_ = 0.0f;
     for (int i = 0; i < frames; ++i) {
-        const double c = ColourStep(colourState, monoBuffer[i], colourCutoff);
-        const double eL = EarlyLeft(early, c) * earlyGain;
-        const double eR = EarlyRight(early, c) * earlyGain;
-        const double p = usePreDelay ? PreDelayStep(preDelayLine, c) : c;
+        const double c = ColourStep(colour, mono[i], cutoff);
+        const double eL = EarlyLeft(early, c) * eGain;
+        const double eR = EarlyRight(early, c) * eGain;
+        const double p = usePreDelay ? PreDelayStep(pre, c) : c;
         double d = Diffuse(lines, p);
         if (crossfade) d = dc * d + (1.0 - dc) * p;
 
         const double u = decayK * Oldest(lines[11]) + d;
         CombWrite(lines[17], u);
-        const double t = TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampingStateLeft);
+        const double t = TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampLeft);
         CombWrite(lines[12], t);
         WriteOnly(lines[13], t);
         WriteOnly(lines[7], t);
 
         const double u2 = decayK * Oldest(lines[7]) + d;
         WriteOnly(lines[19], u2);
-        const double t2 = TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampingStateRight);
+        const double t2 = TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight);
         CombWrite(lines[14], t2);
         WriteOnly(lines[15], t2);
         WriteOnly(lines[11], t2);
 
-        for (int k = 0; k < 20; ++k) StepTap(outputTaps[k]);
+        for (int k = 0; k < 20; ++k) StepTap(taps[k]);
         double wetLeft, wetRight;
         if (!weighted) {
             wetLeft = PlateTapsLeft(lines, taps) + ReadTap(lines[12], taps[14]) - ReadTap(lines[14], taps[15]) +
@@ -69,6 +75,11 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
         }
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
     }
+    v.Store(*this);
+    StoreIndex(preDelayLine, pre);
+    colourState = colour;
+    dampingStateLeft = dampLeft;
+    dampingStateRight = dampRight;
     if (meterSource == 2) {
         raiseLevel(wetPeak_);
         cleanSmoothState();

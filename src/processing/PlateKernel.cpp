@@ -1,8 +1,6 @@
 // The plate (modes 0 and 1, and any mode value not dispatched elsewhere): a figure-of-eight tank fed by a
 // coloured, pre-delayed and diffused mono input, with seven output taps per side plus an early-reflection
 // path per side. Runs on the streaming thread under the core's lock; allocation-free.
-#include <initializer_list>
-
 #include "engine/NetworkTables.h"
 #include "processing/PlateNetwork.h"
 
@@ -34,31 +32,43 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
     makeMono(inLeft, inRight, frames, stride);
     filterMono(frames);
 
-    DelayLine* lines = delayLines;
-    DelayLine* early = earlyLines;
+    NetworkViews v;
+    v.Load(*this, 12, 14, true);
+    LineView* lines = v.lines;
+    LineView* early = v.early;
+    OutputTap* taps = v.taps;
+    PreDelayView pre = ViewOf(preDelayLine);
+    const bool usePreDelay = preDelayOn && pre.length > 0;
     const bool crossfade = (diffusion != 100);
-    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef;
-    const bool usePreDelay = preDelayOn && preDelayLine.length > 0;
+    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, cutoff = colourCutoff;
+    const double eGain = earlyGain;
+    double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
+    const float* mono = monoBuffer.get();
     wetPeak_ = 0.0f;
     for (int i = 0; i < frames; ++i) {
-        const double c = ColourStep(colourState, monoBuffer[i], colourCutoff);
-        const double eL = EarlyLeft(early, c) * earlyGain;
-        const double eR = EarlyRight(early, c) * earlyGain;
-        const double p = usePreDelay ? PreDelayStep(preDelayLine, c) : c;
+        const double c = ColourStep(colour, mono[i], cutoff);
+        const double eL = EarlyLeft(early, c) * eGain;
+        const double eR = EarlyRight(early, c) * eGain;
+        const double p = usePreDelay ? PreDelayStep(pre, c) : c;
         double d = Diffuse(lines, p);
         if (crossfade) d = dc * d + (1.0 - dc) * p;
 
         // Left half, fed back from the right half's end line; then the right half, fed from the left's.
         const double u = decayK * Oldest(lines[11]) + d;
-        WriteOnly(lines[7], TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampingStateLeft));
+        WriteOnly(lines[7], TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampLeft));
         const double u2 = decayK * Oldest(lines[7]) + d;
-        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampingStateRight));
+        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
 
-        for (int t = 0; t < 14; ++t) StepTap(outputTaps[t]);
-        const double wetLeft = PlateTapsLeft(lines, outputTaps) + eL;
-        const double wetRight = PlateTapsRight(lines, outputTaps) + eR;
+        for (int t = 0; t < 14; ++t) StepTap(taps[t]);
+        const double wetLeft = PlateTapsLeft(lines, taps) + eL;
+        const double wetRight = PlateTapsRight(lines, taps) + eR;
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
     }
+    v.Store(*this);
+    StoreIndex(preDelayLine, pre);
+    colourState = colour;
+    dampingStateLeft = dampLeft;
+    dampingStateRight = dampRight;
     if (meterSource == 2) {
         raiseLevel(wetPeak_);
         cleanSmoothState();

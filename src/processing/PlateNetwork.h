@@ -12,7 +12,7 @@
 namespace ulvetta {
 
 // The colour low-pass, a one-pole computed in single precision; the state is kept as a double.
-inline double ColourStep(double& state, double x, double cutoff) {
+ULVETTA_ALWAYS_INLINE double ColourStep(double& state, double x, double cutoff) {
     const float s = static_cast<float>(state);
     const float c = s + (static_cast<float>(x) - s) * static_cast<float>(cutoff);
     state = c;
@@ -20,20 +20,20 @@ inline double ColourStep(double& state, double x, double cutoff) {
 }
 
 // Left early path: allpass, then a plain delay; the impulse arrives after the delay's length.
-inline double EarlyLeft(DelayLine* early, double c) { return Delay(early[2], AllpassA(early[0], c)); }
+ULVETTA_ALWAYS_INLINE double EarlyLeft(LineView* early, double c) { return Delay(early[2], AllpassA(early[0], c)); }
 
 // Right early path: plain delay, then allpass.
-inline double EarlyRight(DelayLine* early, double c) { return AllpassB(early[5], Delay(early[3], c)); }
+ULVETTA_ALWAYS_INLINE double EarlyRight(LineView* early, double c) { return AllpassB(early[5], Delay(early[3], c)); }
 
 // The four input diffusers in series.
-inline double Diffuse(DelayLine* lines, double x) {
+ULVETTA_ALWAYS_INLINE double Diffuse(LineView* lines, double x) {
     return AllpassA(lines[3], AllpassA(lines[2], AllpassA(lines[1], AllpassA(lines[0], x))));
 }
 
 // One tank half from its input u: allpass (second form), an optional crossfade with its input, the
 // (possibly modulated) delay, the damping one-pole and the second allpass. Returns the half's output, which
 // the caller writes into the half's end line. first is the index of the half's first allpass (4 or 8).
-inline double TankHalf(DelayLine* lines, int first, double u, bool crossfade, double diffusionCoef,
+ULVETTA_ALWAYS_INLINE double TankHalf(LineView* lines, int first, double u, bool crossfade, double diffusionCoef,
                        double decayCoef, double dampingCoef, double& dampingState) {
     double v = AllpassB(lines[first], u);
     if (crossfade) v = diffusionCoef * v + (1.0 - diffusionCoef) * u;
@@ -43,12 +43,12 @@ inline double TankHalf(DelayLine* lines, int first, double u, bool crossfade, do
 }
 
 // The seven-tap sums of the plate (taps 0..6 left, 7..13 right), summed in the order written.
-inline double PlateTapsLeft(const DelayLine* d, const OutputTap* t) {
+ULVETTA_ALWAYS_INLINE double PlateTapsLeft(const LineView* d, const OutputTap* t) {
     return ReadTap(d[9], t[1]) + ReadTap(d[9], t[0]) - ReadTap(d[10], t[2]) + ReadTap(d[11], t[3]) -
            ReadTap(d[5], t[4]) - ReadTap(d[6], t[5]) - ReadTap(d[7], t[6]);
 }
 
-inline double PlateTapsRight(const DelayLine* d, const OutputTap* t) {
+ULVETTA_ALWAYS_INLINE double PlateTapsRight(const LineView* d, const OutputTap* t) {
     return ReadTap(d[5], t[8]) + ReadTap(d[5], t[7]) - ReadTap(d[6], t[9]) + ReadTap(d[7], t[10]) -
            ReadTap(d[9], t[11]) - ReadTap(d[10], t[12]) - ReadTap(d[11], t[13]);
 }
@@ -57,6 +57,32 @@ inline double PlateTapsRight(const DelayLine* d, const OutputTap* t) {
 // inside the lines they read. False before the first rebuild (mode or room size unset) or after a rebuild
 // that configured fewer lines than the kernel needs.
 bool NetworkReady(const ReverbEngine& e, int lineCount, int tapCount, bool early);
+
+// A kernel's lines and taps as plain views for the length of one block.
+struct NetworkViews {
+    LineView lines[ReverbEngine::kNetworkLines];
+    LineView early[ReverbEngine::kEarlyLines];
+    OutputTap taps[ReverbEngine::kOutputTaps];
+    int lineCount = 0, tapCount = 0;
+    bool hasEarly = false;
+
+    void Load(ReverbEngine& e, int lines, int tapsUsed, bool withEarly) {
+        lineCount = lines;
+        tapCount = tapsUsed;
+        hasEarly = withEarly;
+        for (int i = 0; i < lineCount; ++i) this->lines[i] = ViewOf(e.delayLines[i]);
+        if (hasEarly)
+            for (int i = 0; i < ReverbEngine::kEarlyLines; ++i) early[i] = ViewOf(e.earlyLines[i]);
+        for (int i = 0; i < tapCount; ++i) taps[i] = e.outputTaps[i];
+    }
+
+    void Store(ReverbEngine& e) const {
+        for (int i = 0; i < lineCount; ++i) StoreIndex(e.delayLines[i], lines[i]);
+        if (hasEarly)
+            for (int i = 0; i < ReverbEngine::kEarlyLines; ++i) StoreIndex(e.earlyLines[i], early[i]);
+        for (int i = 0; i < tapCount; ++i) e.outputTaps[i] = taps[i];
+    }
+};
 
 // The allpass lines whose denormals are flushed once per block.
 inline void FlushAllpassLines(ReverbEngine& e) {

@@ -22,7 +22,8 @@ DelayLine MakeLine(int length, double gain) {
 
 TEST(DelayElements, DelayReturnsItsInputExactlyLengthSamplesLater) {
     for (int n : {220, 257, 1009}) {
-        DelayLine l = MakeLine(n, 0.0);
+        DelayLine line = MakeLine(n, 0.0);
+        LineView l = ViewOf(line);
         std::vector<double> in(3 * n);
         for (size_t i = 0; i < in.size(); ++i) in[i] = std::sin(0.37 * i) + 0.001 * i;
         for (size_t i = 0; i < in.size(); ++i) {
@@ -33,7 +34,8 @@ TEST(DelayElements, DelayReturnsItsInputExactlyLengthSamplesLater) {
 }
 
 TEST(DelayElements, AllpassesWithZeroGainArePlainDelays) {
-    DelayLine a = MakeLine(223, 0.0), b = MakeLine(223, 0.0), d = MakeLine(223, 0.0);
+    DelayLine la = MakeLine(223, 0.0), lb = MakeLine(223, 0.0), ld = MakeLine(223, 0.0);
+    LineView a = ViewOf(la), b = ViewOf(lb), d = ViewOf(ld);
     for (int i = 0; i < 1000; ++i) {
         const double x = std::cos(0.11 * i) * (i % 7);
         const double expected = Delay(d, x);
@@ -47,7 +49,8 @@ TEST(DelayElements, AllpassesWithZeroGainArePlainDelays) {
 TEST(DelayElements, AllpassImpulseResponsesFollowTheirDifferenceEquations) {
     const int n = 229;
     for (double g : {0.81, 0.5, -0.65}) {
-        DelayLine a = MakeLine(n, g), b = MakeLine(n, g);
+        DelayLine la = MakeLine(n, g), lb = MakeLine(n, g);
+        LineView a = ViewOf(la), b = ViewOf(lb);
         double energyA = 0.0, energyB = 0.0;
         for (int i = 0; i < 200 * n; ++i) {
             const double x = (i == 0) ? 1.0 : 0.0;
@@ -71,7 +74,8 @@ TEST(DelayElements, AllpassImpulseResponsesFollowTheirDifferenceEquations) {
 }
 
 TEST(DelayElements, WriteOnlyCombWriteAndOldest) {
-    DelayLine w = MakeLine(227, 0.0), c = MakeLine(227, 0.5);
+    DelayLine lw = MakeLine(227, 0.0), lc = MakeLine(227, 0.5);
+    LineView w = ViewOf(lw), c = ViewOf(lc);
     for (int i = 0; i < 3 * 227; ++i) {
         const double x = (i == 0) ? 1.0 : 0.0;
         // Oldest is the sample stored a full length ago, i.e. the one about to be overwritten.
@@ -86,8 +90,9 @@ TEST(DelayElements, WriteOnlyCombWriteAndOldest) {
 }
 
 TEST(DelayElements, PreDelayReturnsItsInputLengthSamplesLater) {
-    PreDelayLine p;
-    p.Create(44);
+    PreDelayLine line;
+    line.Create(44);
+    PreDelayView p = ViewOf(line);
     for (int i = 0; i < 200; ++i) {
         const double y = PreDelayStep(p, i + 1.0);
         ASSERT_EQ(y, i < 44 ? 0.0 : i + 1.0 - 44) << i;
@@ -99,7 +104,8 @@ TEST(DelayElements, PreDelayReturnsItsInputLengthSamplesLater) {
 TEST(DelayElements, TapsReadAFixedDelayAndWrapInShortLines) {
     const int n = 220;
     for (int position : {0, 1, 121, 219, 266, 1996, 3627}) {
-        DelayLine l = MakeLine(n, 0.0);
+        DelayLine line = MakeLine(n, 0.0);
+        LineView l = ViewOf(line);
         OutputTap t{position % n, n};
         const int delay = ((position - 1) % n + n) % n;
         for (int i = 0; i < 3 * n; ++i) {
@@ -142,11 +148,12 @@ TEST(DelayElements, ModulatorPeriodRoundsUpAndOffsetsSweepAHalfSine) {
 }
 
 TEST(DelayElements, ModulatedLineWithZeroDepthIsAPlainLine) {
-    DelayLine plain = MakeLine(331, 0.6), modulated = MakeLine(331, 0.6);
-    modulated.mod.reset(new Modulator);
-    modulated.mod->SetModSampleRate(44100);
-    modulated.mod->SetModRate(0.7);
-    modulated.mod->SetModDepth(0);
+    DelayLine plainLine = MakeLine(331, 0.6), modulatedLine = MakeLine(331, 0.6);
+    modulatedLine.mod.reset(new Modulator);
+    modulatedLine.mod->SetModSampleRate(44100);
+    modulatedLine.mod->SetModRate(0.7);
+    modulatedLine.mod->SetModDepth(0);
+    LineView plain = ViewOf(plainLine), modulated = ViewOf(modulatedLine);
     for (int i = 0; i < 2000; ++i) {
         const double x = std::sin(0.05 * i);
         ASSERT_EQ(AllpassB(modulated, x), AllpassB(plain, x)) << i;
@@ -158,14 +165,15 @@ TEST(DelayElements, ModulatedLineWithZeroDepthIsAPlainLine) {
 // where extrapolating past a neighbour would approach twice the amplitude.
 TEST(DelayElements, ModulatedReadInterpolatesBetweenNeighbours) {
     const int n = 401, depth = 9, rate = 1000;
-    DelayLine ramp = MakeLine(n, 0.0), nyquist = MakeLine(n, 0.0);
-    for (DelayLine* l : {&ramp, &nyquist}) {
+    DelayLine rampLine = MakeLine(n, 0.0), nyquistLine = MakeLine(n, 0.0);
+    for (DelayLine* l : {&rampLine, &nyquistLine}) {
         l->mod.reset(new Modulator);
         l->mod->SetModSampleRate(rate);
         l->mod->SetModRate(3.0);  // 334-sample period: every fractional offset in both halves occurs
         l->mod->SetModDepth(depth);
     }
-    Modulator reference = *ramp.mod;
+    LineView ramp = ViewOf(rampLine), nyquist = ViewOf(nyquistLine);
+    Modulator reference = *rampLine.mod;
     bool sawNegativeFraction = false, sawPositiveFraction = false;
     for (int i = 0; i < 4 * n; ++i) {
         const double offset = reference.Tick();
@@ -188,15 +196,18 @@ TEST(DelayElements, ModulatedReadInterpolatesBetweenNeighbours) {
 TEST(DelayElements, FlushClearsDenormalsOnlyOnceTheLineHasFallenSilent) {
     const double denormal = std::numeric_limits<double>::denorm_min() * 12345.0;
     DelayLine l = MakeLine(233, 0.7);
-    for (int i = 0; i < 233; ++i) AllpassA(l, 1e-3);
+    LineView lv = ViewOf(l);
+    for (int i = 0; i < 233; ++i) AllpassA(lv, 1e-3);
+    StoreIndex(l, lv);
     l.samples[17] = denormal;
     FlushLine(l);  // the latest entry still carries signal: nothing is scanned
     EXPECT_EQ(l.samples[17], denormal);
 
-    DelayLine quiet = MakeLine(233, 0.0);
-    for (int i = 0; i < 233; ++i) AllpassA(quiet, 1e-3);
-    for (int i = 0; i < 234; ++i) AllpassA(quiet, 0.0);
-    DelayLine& q = quiet;
+    DelayLine q = MakeLine(233, 0.0);
+    LineView qv = ViewOf(q);
+    for (int i = 0; i < 233; ++i) AllpassA(qv, 1e-3);
+    for (int i = 0; i < 234; ++i) AllpassA(qv, 0.0);
+    StoreIndex(q, qv);
     for (int i = 0; i < 233; i += 3) q.samples[i] = denormal;
     q.samples[100] = 1e-200;  // a tiny normal value stays: only denormals are replaced
     FlushLine(q);
