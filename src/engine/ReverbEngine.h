@@ -132,6 +132,7 @@ private:
     void meterInput(const float* inLeft, const float* inRight, int frames, int stride);
     void makeMono(const float* inLeft, const float* inRight, int frames, int stride);
     void filterMono(int frames);
+    void filterStereo(float* frames, int count);
     void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
                    int stride, int accumulate, double wetLeft, double wetRight);
     void meterOutput(const float* outLeft, const float* outRight, int frames, int stride);

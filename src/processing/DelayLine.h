@@ -39,6 +39,11 @@ struct Modulator {
         return m;
     }
 
+    // Advances the phase without computing the excursion (for a line that is never read modulated).
+    void Advance() {
+        if (++phase >= period) phase = 0;
+    }
+
 private:
     static constexpr int32_t kResyncInterval = 256;
     void Update();

@@ -33,12 +33,12 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
         scratch[2 * i] = (std::isfinite(l) ? l : 0.0f) * gain;
         scratch[2 * i + 1] = (std::isfinite(r) ? r : 0.0f) * gain;
     }
-    for (int s = 0; s < 3; ++s) ProcessInterleaved(filterSections[s], scratch, frames);
+    filterStereo(scratch, frames);
 
     NetworkViews v;
     v.Load(*this, 12, 14, false);
     LineView* lines = v.lines;
-    OutputTap* taps = v.taps;
+    TapViews& taps = v.taps;
     double* echo = preDelayLine.samples.get();
     const int32_t echoLength = preDelayLine.length;
     int32_t k = preDelayLine.writeIndex;
@@ -57,13 +57,13 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
         WriteOnly(lines[7], TankHalf(lines, 4, u, false, dc, decayK, dampK, dampLeft));
         const double u2 = decayK * Oldest(lines[7]) + q;
         WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
-        for (int t = 0; t < 14; ++t) StepTap(taps[t]);
+        StepTaps(taps, 14);
         const double tankLeft = PlateTapsLeft(lines, taps);
         const double tankRight = PlateTapsRight(lines, taps);
 
-        echo[k] = scratch[2 * i] + feedback * (cL + kCrossFeed * cR);
+        echo[k] = NoDenormal(scratch[2 * i] + feedback * (cL + kCrossFeed * cR));
         k = k1;
-        echo[k] = scratch[2 * i + 1] + feedback * (cR + kCrossFeed * cL);
+        echo[k] = NoDenormal(scratch[2 * i + 1] + feedback * (cR + kCrossFeed * cL));
         if (++k == echoLength) k = 0;
 
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, tankLeft + cL, tankRight + cR);
@@ -78,7 +78,6 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
         raiseLevel(wetPeak_);
         cleanSmoothState();
     }
-    FlushAllpassLines(*this);
     flushKernelStates();
     colourState2 = flushTiny(colourState2);
     if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);

@@ -24,7 +24,7 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
     v.Load(*this, 20, 20, true);
     LineView* lines = v.lines;
     LineView* early = v.early;
-    OutputTap* taps = v.taps;
+    TapViews& taps = v.taps;
     PreDelayView pre = ViewOf(preDelayLine);
     const bool usePreDelay = preDelayOn && pre.length > 0;
     const bool crossfade = (diffusion != 100);
@@ -56,22 +56,22 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
         WriteOnly(lines[15], t2);
         WriteOnly(lines[11], t2);
 
-        for (int k = 0; k < 20; ++k) StepTap(taps[k]);
+        StepTaps(taps, 20);
         double wetLeft, wetRight;
         if (!weighted) {
-            wetLeft = PlateTapsLeft(lines, taps) + ReadTap(lines[12], taps[14]) - ReadTap(lines[14], taps[15]) +
-                      ReadTap(lines[19], taps[18]) + eL;
-            wetRight = PlateTapsRight(lines, taps) + ReadTap(lines[13], taps[16]) -
-                       ReadTap(lines[15], taps[17]) + ReadTap(lines[17], taps[19]) + eR;
+            wetLeft = PlateTapsLeft(lines, taps) + ReadTap(lines[12], taps, 14) - ReadTap(lines[14], taps, 15) +
+                      ReadTap(lines[19], taps, 18) + eL;
+            wetRight = PlateTapsRight(lines, taps) + ReadTap(lines[13], taps, 16) -
+                       ReadTap(lines[15], taps, 17) + ReadTap(lines[17], taps, 19) + eR;
         } else {
-            wetLeft = -0.3 * ReadTap(lines[10], taps[2]) + 2.0 * ReadTap(lines[11], taps[3]) -
-                      0.3 * ReadTap(lines[6], taps[5]) - 2.0 * ReadTap(lines[7], taps[6]) +
-                      2.0 * ReadTap(lines[12], taps[14]) - 2.0 * ReadTap(lines[14], taps[15]) +
-                      0.3 * ReadTap(lines[19], taps[18]) + eL;
-            wetRight = -0.3 * ReadTap(lines[6], taps[9]) + 2.0 * ReadTap(lines[7], taps[10]) -
-                       0.3 * ReadTap(lines[10], taps[12]) - 2.0 * ReadTap(lines[11], taps[13]) +
-                       2.0 * ReadTap(lines[13], taps[16]) - 2.0 * ReadTap(lines[15], taps[17]) +
-                       0.3 * ReadTap(lines[17], taps[19]) + eR;
+            wetLeft = -0.3 * ReadTap(lines[10], taps, 2) + 2.0 * ReadTap(lines[11], taps, 3) -
+                      0.3 * ReadTap(lines[6], taps, 5) - 2.0 * ReadTap(lines[7], taps, 6) +
+                      2.0 * ReadTap(lines[12], taps, 14) - 2.0 * ReadTap(lines[14], taps, 15) +
+                      0.3 * ReadTap(lines[19], taps, 18) + eL;
+            wetRight = -0.3 * ReadTap(lines[6], taps, 9) + 2.0 * ReadTap(lines[7], taps, 10) -
+                       0.3 * ReadTap(lines[10], taps, 12) - 2.0 * ReadTap(lines[11], taps, 13) +
+                       2.0 * ReadTap(lines[13], taps, 16) - 2.0 * ReadTap(lines[15], taps, 17) +
+                       0.3 * ReadTap(lines[17], taps, 19) + eR;
         }
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
     }
@@ -84,8 +84,6 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
         raiseLevel(wetPeak_);
         cleanSmoothState();
     }
-    // The comb lines are left alone: only the allpass lines and the one-pole states are flushed.
-    FlushAllpassLines(*this);
     flushKernelStates();
     if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);

@@ -36,7 +36,7 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
     v.Load(*this, 12, 14, true);
     LineView* lines = v.lines;
     LineView* early = v.early;
-    OutputTap* taps = v.taps;
+    TapViews& taps = v.taps;
     PreDelayView pre = ViewOf(preDelayLine);
     const bool usePreDelay = preDelayOn && pre.length > 0;
     const bool crossfade = (diffusion != 100);
@@ -59,7 +59,7 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
         const double u2 = decayK * Oldest(lines[7]) + d;
         WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
 
-        for (int t = 0; t < 14; ++t) StepTap(taps[t]);
+        StepTaps(taps, 14);
         const double wetLeft = PlateTapsLeft(lines, taps) + eL;
         const double wetRight = PlateTapsRight(lines, taps) + eR;
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
@@ -73,7 +73,6 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
         raiseLevel(wetPeak_);
         cleanSmoothState();
     }
-    FlushAllpassLines(*this);
     flushKernelStates();
     if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);

@@ -4,9 +4,8 @@
 // processing folder; everything inline and allocation-free.
 #pragma once
 
-#include <initializer_list>
-
 #include "engine/ReverbEngine.h"
+#include "processing/BlockFrame.h"
 #include "processing/DelayElements.h"
 
 namespace ulvetta {
@@ -43,14 +42,14 @@ ULVETTA_ALWAYS_INLINE double TankHalf(LineView* lines, int first, double u, bool
 }
 
 // The seven-tap sums of the plate (taps 0..6 left, 7..13 right), summed in the order written.
-ULVETTA_ALWAYS_INLINE double PlateTapsLeft(const LineView* d, const OutputTap* t) {
-    return ReadTap(d[9], t[1]) + ReadTap(d[9], t[0]) - ReadTap(d[10], t[2]) + ReadTap(d[11], t[3]) -
-           ReadTap(d[5], t[4]) - ReadTap(d[6], t[5]) - ReadTap(d[7], t[6]);
+ULVETTA_ALWAYS_INLINE double PlateTapsLeft(const LineView* d, const TapViews& t) {
+    return ReadTap(d[9], t, 1) + ReadTap(d[9], t, 0) - ReadTap(d[10], t, 2) + ReadTap(d[11], t, 3) -
+           ReadTap(d[5], t, 4) - ReadTap(d[6], t, 5) - ReadTap(d[7], t, 6);
 }
 
-ULVETTA_ALWAYS_INLINE double PlateTapsRight(const LineView* d, const OutputTap* t) {
-    return ReadTap(d[5], t[8]) + ReadTap(d[5], t[7]) - ReadTap(d[6], t[9]) + ReadTap(d[7], t[10]) -
-           ReadTap(d[9], t[11]) - ReadTap(d[10], t[12]) - ReadTap(d[11], t[13]);
+ULVETTA_ALWAYS_INLINE double PlateTapsRight(const LineView* d, const TapViews& t) {
+    return ReadTap(d[5], t, 8) + ReadTap(d[5], t, 7) - ReadTap(d[6], t, 9) + ReadTap(d[7], t, 10) -
+           ReadTap(d[9], t, 11) - ReadTap(d[10], t, 12) - ReadTap(d[11], t, 13);
 }
 
 // Lines 0..lineCount-1 (and the early lines when early is set) have storage, and taps 0..tapCount-1 point
@@ -62,7 +61,7 @@ bool NetworkReady(const ReverbEngine& e, int lineCount, int tapCount, bool early
 struct NetworkViews {
     LineView lines[ReverbEngine::kNetworkLines];
     LineView early[ReverbEngine::kEarlyLines];
-    OutputTap taps[ReverbEngine::kOutputTaps];
+    TapViews taps;
     int lineCount = 0, tapCount = 0;
     bool hasEarly = false;
 
@@ -73,20 +72,18 @@ struct NetworkViews {
         for (int i = 0; i < lineCount; ++i) this->lines[i] = ViewOf(e.delayLines[i]);
         if (hasEarly)
             for (int i = 0; i < ReverbEngine::kEarlyLines; ++i) early[i] = ViewOf(e.earlyLines[i]);
-        for (int i = 0; i < tapCount; ++i) taps[i] = e.outputTaps[i];
+        for (int i = 0; i < tapCount; ++i) {
+            taps.index[i] = e.outputTaps[i].index;
+            taps.length[i] = e.outputTaps[i].length;
+        }
     }
 
     void Store(ReverbEngine& e) const {
         for (int i = 0; i < lineCount; ++i) StoreIndex(e.delayLines[i], lines[i]);
         if (hasEarly)
             for (int i = 0; i < ReverbEngine::kEarlyLines; ++i) StoreIndex(e.earlyLines[i], early[i]);
-        for (int i = 0; i < tapCount; ++i) e.outputTaps[i] = taps[i];
+        for (int i = 0; i < tapCount; ++i) e.outputTaps[i].index = taps.index[i];
     }
 };
-
-// The allpass lines whose denormals are flushed once per block.
-inline void FlushAllpassLines(ReverbEngine& e) {
-    for (int i : {0, 1, 2, 3, 4, 6, 8, 10}) FlushLine(e.delayLines[i]);
-}
 
 }  // namespace ulvetta
