@@ -12,8 +12,8 @@ namespace ulvetta {
 // depth x sin(pi x phase / periodLength) samples, and the phase wraps to 0 at period.
 //
 // The sine is advanced by a rotation (four multiplications a sample) and recomputed exactly from the phase
-// every kResyncInterval samples, at each wrap and whenever the phase or period has been changed from
-// outside; the accumulated rounding stays below 1e-13 of the depth.
+// every kResyncInterval samples, at each wrap and after a change of period; the accumulated rounding stays
+// below 1e-13 of the depth. The phase is only moved by Tick, Advance and the period update.
 struct Modulator {
     double rate = -1.0;          // Hz; -1 until set
     int32_t sampleRate = -1;     // Hz; -1 until set
@@ -28,20 +28,21 @@ struct Modulator {
 
     // The current excursion in samples; advances the phase.
     double Tick() {
-        if (phase != sinePhase_ || untilResync_ == 0) Resync();
+        if (untilResync_ <= 0) Resync();
         const double m = depth * sine_;
         const double s = sine_ * stepCos_ + cosine_ * stepSin_;
         cosine_ = cosine_ * stepCos_ - sine_ * stepSin_;
         sine_ = s;
         --untilResync_;
         if (++phase >= period) phase = 0;
-        sinePhase_ = phase;
         return m;
     }
 
-    // Advances the phase without computing the excursion (for a line that is never read modulated).
+    // Advances the phase without computing the excursion (for a line that is never read modulated); the
+    // next Tick recomputes the sine from the phase.
     void Advance() {
         if (++phase >= period) phase = 0;
+        untilResync_ = 0;
     }
 
 private:
@@ -49,10 +50,9 @@ private:
     void Update();
     void Resync();
 
-    // Sine and cosine of pi x sinePhase_ / periodLength, and of one phase step.
+    // Sine and cosine of pi x phase / periodLength, and of one phase step.
     double sine_ = 0.0, cosine_ = 1.0, stepSin_ = 0.0, stepCos_ = 1.0;
-    int32_t sinePhase_ = -1;  // phase the values above belong to; -1 forces a resync
-    int32_t untilResync_ = 0;
+    int32_t untilResync_ = 0;  // ticks left before the sine is recomputed from the phase
 };
 
 struct DelayLine {
