@@ -7,6 +7,7 @@
 #include <random>
 #include <string>
 #include <tuple>
+#include <vector>
 
 #include "dsp/NetworkTestSupport.h"
 
@@ -125,6 +126,48 @@ TEST(EchoKernel, DiffusionFeedsTheTank) {
     long firstRight = FirstNonZero(out, false);
     EXPECT_GT(firstRight, 441);
     EXPECT_LT(firstRight, 2 * 441);
+}
+
+// Modes 2 and 6 run one network and differ only in how the taps are weighted: after the same input every
+// line holds the same samples, while the outputs differ.
+TEST(ExtendedPlateKernel, ModesTwoAndSixShareTheNetwork) {
+    ReverbEngine two, six;
+    Settings s = test::FactorySettings(2);
+    test::Start(two, 44100, s);
+    s.mode = 6;
+    test::Start(six, 44100, s);
+    const Stereo in = Noise(30000, 0.5f, 21);
+    const Stereo a = test::Render(two, in), b = test::Render(six, in);
+    for (int line = 0; line < 20; ++line) {
+        ASSERT_EQ(two.delayLines[line].length, six.delayLines[line].length);
+        for (int i = 0; i < two.delayLines[line].length; ++i)
+            ASSERT_EQ(two.delayLines[line].samples[i], six.delayLines[line].samples[i]) << "line " << line;
+    }
+    double difference = 0.0;
+    for (size_t i = 0; i < a.samples.size(); ++i) difference += std::fabs(a.samples[i] - b.samples[i]);
+    EXPECT_GT(difference, 1.0);
+}
+
+// A filter section set to pass-through is skipped, but its history must end where filtering would have
+// left it, so that a later redesign of the section starts from the right state.
+TEST(BlockFrame, PassThroughSectionKeepsTheHistoryFilteringWouldLeave) {
+    for (int frames : {1, 2, 300}) {
+        ReverbEngine e;
+        test::Start(e, 44100, test::FactorySettings(0));  // low pass "Off", notch at 0 dB: pass-through
+        BiquadSection lowPass = e.filterSections[0];
+        BiquadSection notch = e.filterSections[2];
+        ASSERT_EQ(lowPass.b0, 1.0);
+        ASSERT_EQ(notch.b0, 1.0);
+        const Stereo in = Noise(frames, 0.5f, 4);
+        std::vector<float> mono(frames);
+        for (int i = 0; i < frames; ++i) mono[i] = (in.left(i) + in.right(i)) * 0.5f * 1.0f;
+        ProcessMono(lowPass, mono.data(), frames);
+        test::Render(e, in);
+        EXPECT_EQ(e.filterSections[0].x1L, lowPass.x1L) << frames;
+        EXPECT_EQ(e.filterSections[0].x2L, lowPass.x2L) << frames;
+        EXPECT_EQ(e.filterSections[0].y1L, lowPass.y1L) << frames;
+        EXPECT_EQ(e.filterSections[0].y2L, lowPass.y2L) << frames;
+    }
 }
 
 // The drain trims: once flushing, a block returns the index + 1 of its last frame above -313 dB, and the
