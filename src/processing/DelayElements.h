@@ -150,8 +150,9 @@ ULVETTA_ALWAYS_INLINE double ReadTap(const LineView& l, const OutputTap& t) { re
 // A kernel's output taps for the length of a block, positions and lengths in separate arrays so that the
 // per-sample step of all taps compiles to a few vector operations.
 struct TapViews {
-    int32_t index[20];
-    int32_t length[20];
+    static constexpr int kMaxTaps = 20;
+    int32_t index[kMaxTaps];
+    int32_t length[kMaxTaps];
 };
 
 ULVETTA_ALWAYS_INLINE void StepTaps(TapViews& t, int count) {

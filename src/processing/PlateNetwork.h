@@ -1,7 +1,7 @@
 // Pieces of the figure-of-eight plate tank shared by the plate, extended-plate and diffused-echo kernels:
 // the colour one-pole, the early-reflection paths, the input diffusers, one tank half and the fourteen-tap
-// output sums; plus the check that a mode's lines exist before a kernel touches them. Internal to the
-// processing folder; everything inline and allocation-free.
+// output sums; the per-block views of a kernel's lines and taps; and the check that a mode's lines exist
+// before a kernel touches them. Internal to the processing folder; allocation-free.
 #pragma once
 
 #include "engine/ReverbEngine.h"
@@ -33,7 +33,7 @@ ULVETTA_ALWAYS_INLINE double Diffuse(LineView* lines, double x) {
 // (possibly modulated) delay, the damping one-pole and the second allpass. Returns the half's output, which
 // the caller writes into the half's end line. first is the index of the half's first allpass (4 or 8).
 ULVETTA_ALWAYS_INLINE double TankHalf(LineView* lines, int first, double u, bool crossfade, double diffusionCoef,
-                       double decayCoef, double dampingCoef, double& dampingState) {
+                                      double decayCoef, double dampingCoef, double& dampingState) {
     double v = AllpassB(lines[first], u);
     if (crossfade) v = diffusionCoef * v + (1.0 - diffusionCoef) * u;
     const double w = Delay(lines[first + 1], v);
