@@ -170,6 +170,24 @@ TEST(BlockFrame, PassThroughSectionKeepsTheHistoryFilteringWouldLeave) {
     }
 }
 
+// The kernels keep their state between blocks (line positions, taps, modulator phases, filter states), so
+// the output does not depend on how the stream is cut into blocks.
+TEST(BlockFrame, OutputDoesNotDependOnTheBlockSize) {
+    for (int mode : {0, 1, 2, 6, 7}) {
+        const Stereo in = Noise(20000, 0.5f, 31);
+        ReverbEngine reference;
+        test::Start(reference, 48000, test::FactorySettings(mode));
+        const Stereo expected = test::Render(reference, in, 512);
+        for (int block : {1, 37, 4096}) {
+            ReverbEngine e;
+            test::Start(e, 48000, test::FactorySettings(mode));
+            const Stereo out = test::Render(e, in, block);
+            for (size_t i = 0; i < in.samples.size(); ++i)
+                ASSERT_EQ(out.samples[i], expected.samples[i]) << "mode " << mode << " block " << block << " at " << i;
+        }
+    }
+}
+
 // The drain trims: once flushing, a block returns the index + 1 of its last frame above -313 dB, and the
 // frames past that are silent.
 TEST(BlockFrame, DrainEndsAndTrimsTheTail) {
