@@ -15,7 +15,6 @@
 #include <cmath>
 #include <cstdint>
 
-#include "processing/BiquadSection.h"
 #include "processing/DelayLine.h"
 
 // The elements run millions of times per second; inlining them even in unoptimised (debug and sanitizer)
