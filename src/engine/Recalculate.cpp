@@ -1,6 +1,10 @@
+// Network sizing: rebuilds the delay lines, early-reflection lines, modulators and output taps of the
+// current algorithm mode for the sample rate and room size. Allocates; called from the setters and the
+// stream-start reset, never from the audio path.
 #include <algorithm>
 #include <cmath>
 
+#include "engine/NetworkTables.h"
 #include "engine/ReverbEngine.h"
 #include "engine/StoredResponses.h"
 
@@ -8,26 +12,18 @@ namespace ulvetta {
 
 namespace {
 
-// Lines 0..19 at 29761 Hz and room size 50, with their coefficients.
-constexpr int kBaseLength[20] = {142,  107,  379,  277,  672,  4453, 1800, 3720, 908,  4217,
-                                 2656, 3163, 2763, 3567, 7027, 3497, 9173, 5211, 4689, 6713};
-constexpr double kGain[20] = {0.81, 0.81, 0.71, 0.71, 0.7, 0, 0.5, 0, 0.7, 0, 0.5, 0, 0, 0, 0, 0, 0, 0, 0, 0};
-// The modulated plate (mode 1) uses lines 0..11 with these gains, depths (samples) and rates (Hz).
-constexpr double kMode1Gain[12] = {0.75, 0.75, 0.625, 0.625, 0.7, 0, 0.5, 0, 0.7, 0, 0.5, 0};
-constexpr int kMode1Depth[12] = {0, 0, 0, 0, 2, 5, 7, 9, 3, 7, 7, 4};
-constexpr double kMode1Rate[12] = {0, 0, 0, 0, 0.5, 0.3, 0.7, 0.1, 0.3, 0.27, 0.21, 0.08};
-
-// Early-reflection lines; the gains are single-precision values.
-constexpr int kEarlyBaseLength[6] = {342, 619, 59, 39, 518, 379};
-constexpr double kEarlyGain[6] = {0.699999988079071, -0.6499999761581421, 0.0, 0.0, -0.699999988079071,
-                                  0.800000011920929};
-
-// Output tap i reads line kTapLine[i] at kTapPosition[i] (unscaled; wrapped into short lines).
-constexpr int kTapLine[20] = {9, 9, 10, 11, 5, 6, 7, 5, 5, 6, 7, 9, 10, 11, 12, 14, 13, 15, 19, 17};
-constexpr int kTapPosition[20] = {266, 2974, 1913, 1996, 1990, 187, 1066, 353,  3627, 1228,
-                                  2673, 2111, 335,  121,  897,  359, 375,  729, 527,  698};
-
 constexpr double kMilli = 0.0010000000474974513;  // 0.001f
+
+// Points taps 0..tapCount-1 at their positions in lines that have just been configured; a position past the
+// end of a short line wraps around.
+void configureTaps(OutputTap* taps, const DelayLine* lines, int lineCount, int tapCount) {
+    for (int i = 0; i < tapCount; ++i) {
+        const int line = network::kTapLine[i];
+        if (line >= lineCount) continue;
+        taps[i].length = lines[line].length;
+        taps[i].index = network::kTapPosition[i] % taps[i].length;
+    }
+}
 
 }  // namespace
 
@@ -45,25 +41,23 @@ void ReverbEngine::Recalculate() {
         return;
     }
 
-    int lines = 0;
     if (mode == 7) {
-        // Diffused delay: the pre-delay line becomes the echo line of twice the pre-delay time.
+        // Diffused delay: the pre-delay line becomes the echo memory, two entries (left, right) per frame of
+        // the echo period.
         const int p = std::max(preDelay, 1);
         const int n = static_cast<int>(std::round(static_cast<double>(r * p) * kMilli));
         preDelayLine.Create(2 * n);
         diffusionCoef = diffusion * 0.005;
-        echoFeedback = decay * 0.004166666666666667;
-        lines = 12;
-        for (int i = 0; i < lines; ++i) delayLines[i].ConfigureLine(r, R, kBaseLength[i], kGain[i], 0, 0.0, true);
-        for (int i = 0; i < 14; ++i) {
-            outputTaps[i].length = delayLines[kTapLine[i]].length;
-            outputTaps[i].index = kTapPosition[i] % outputTaps[i].length;
-        }
+        echoFeedback = decay * 0.004166666666666667;  // decay / 240
+        for (int i = 0; i < 12; ++i)
+            delayLines[i].ConfigureLine(r, R, network::kBaseLength[i], network::kGain[i], 0, 0.0, true);
+        configureTaps(outputTaps, delayLines, 12, 14);
         return;
     }
 
     partitions.reset();
     partitionCount = 0;
+    int lines = 0;
     if (mode == 0) {
         lines = 16;
     } else if (mode == 2 || mode == 6) {
@@ -71,21 +65,18 @@ void ReverbEngine::Recalculate() {
     } else if (mode == 1) {
         lines = 12;
     }
-    if (mode == 1) {
-        for (int i = 0; i < lines; ++i)
-            delayLines[i].ConfigureLine(r, R, kBaseLength[i], kMode1Gain[i], kMode1Depth[i], kMode1Rate[i], true);
-    } else {
-        for (int i = 0; i < lines; ++i) delayLines[i].ConfigureLine(r, R, kBaseLength[i], kGain[i], 0, 0.0, true);
+    for (int i = 0; i < lines; ++i) {
+        if (mode == 1)
+            delayLines[i].ConfigureLine(r, R, network::kBaseLength[i], network::kMode1Gain[i],
+                                        network::kMode1Depth[i], network::kMode1Rate[i], true);
+        else
+            delayLines[i].ConfigureLine(r, R, network::kBaseLength[i], network::kGain[i], 0, 0.0, true);
     }
     if (lines > 0) {
         for (int i = 0; i < kEarlyLines; ++i)
-            earlyLines[i].ConfigureLine(r, R, kEarlyBaseLength[i], kEarlyGain[i], 0, 0.0, false);
+            earlyLines[i].ConfigureLine(r, R, network::kEarlyBaseLength[i], network::kEarlyGain[i], 0, 0.0, false);
     }
-    for (int i = 0; i < kOutputTaps; ++i) {
-        if (kTapLine[i] >= lines) continue;
-        outputTaps[i].length = delayLines[kTapLine[i]].length;
-        outputTaps[i].index = kTapPosition[i] % outputTaps[i].length;
-    }
+    configureTaps(outputTaps, delayLines, lines, kOutputTaps);
 }
 
 }  // namespace ulvetta

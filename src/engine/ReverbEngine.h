@@ -118,7 +118,7 @@ public:
     DelayLine earlyLines[kEarlyLines];
     PreDelayLine preDelayLine;
     std::unique_ptr<float[]> monoBuffer;
-    int32_t monoCapacity = 0;  // frames
+    int32_t monoCapacity = 0;  // floats: one per frame (mono), two per frame in the stereo echo
     bool flushLatched = false;
     bool tailTrimArmed = false;
     float smoothCoefs[5] = {0, 0, 0, 0, 0};  // b0, b1, b2, a1, a2
@@ -127,6 +127,7 @@ public:
     std::unique_ptr<float[]> irLeft, irRight;  // the prepared response, irLength samples each
     HistoryRing historyLeft, historyRight;       // the convolution's input history
     float headLeft = 0.0f, headRight = 0.0f;     // latest outputs of the direct FIR head
+    double partSumLeft[32] = {}, partSumRight[32] = {};  // the partitions' output for the current 32 frames
     FirState firLeft, firRight;                  // the response's first 64 samples, applied directly
     int32_t partitionCount = 0;                  // records in partitions, the head (record 0) included
     int32_t irLength = 0;
@@ -146,12 +147,14 @@ private:
     // stays stable at any rate while the parameter keeps the value the user set.
     int designLimit(int hz) const;
 
-    // Pieces of the per-block frame shared by the kernels.
-    void latchFlush(int flush);
+    // Pieces of the per-block frame shared by the kernels. preDelayInPath: the kernel writes the pre-delay
+    // line, so the end-of-stream tail cannot end while it still holds signal.
+    void latchFlush(int flush, bool preDelayInPath);
     void decayMeter(int frames);
     void meterInput(const float* inLeft, const float* inRight, int frames, int stride);
     void makeMono(const float* inLeft, const float* inRight, int frames, int stride);
     void filterMono(int frames);
+    void filterStereo(float* frames, int count);
     void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
                    int stride, int accumulate, double wetLeft, double wetRight);
     void meterOutput(const float* outLeft, const float* outRight, int frames, int stride);
@@ -163,8 +166,19 @@ private:
     void raiseLevel(float peak);
     void cleanSmoothState();
 
+    // Grows the scratch buffer to hold at least count floats; returns it.
+    float* growScratch(int32_t count);
+
+    // The kernels: one block each, inside the block frame (input stage, mix, meters, tail trimming).
+    // processDry runs the frame with a silent wet signal, for a mode whose network does not exist (yet).
     int processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                      int stride, int accumulate, int flush);
+    int processExtendedPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                             int frames, int stride, int accumulate, int flush);
+    int processEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                    int stride, int accumulate, int flush);
+    int processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                   int stride, int accumulate, int flush);
     int processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                            int stride, int accumulate, int flush);
 

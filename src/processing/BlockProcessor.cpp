@@ -6,17 +6,13 @@
 #include <cmath>
 #include <cstring>
 
-#include "engine/ReverbEngine.h"
+#include "processing/BlockFrame.h"
 
 namespace ulvetta {
 
 namespace {
 
 constexpr double kMeterDecayPerMs = 0.9993910013652971;  // -0.00529 dB per millisecond
-
-// A non-finite input sample (from a faulty upstream source) is taken as silence, so that it can never
-// poison the recirculating state or the mix.
-inline float finiteOrZero(float v) { return std::isfinite(v) ? v : 0.0f; }
 
 // Zero or denormal float: its exponent field is zero.
 inline bool exponentIsZero(float v) {
@@ -27,17 +23,6 @@ inline bool exponentIsZero(float v) {
 
 }  // namespace
 
-float ReverbEngine::smooth(float v) {
-    const float* c = smoothCoefs;
-    float* s = smoothState;  // x1, x2, y1, y2
-    const float y = c[0] * v + c[1] * s[0] + c[2] * s[1] - c[3] * s[2] - c[4] * s[3];
-    s[1] = s[0];
-    s[0] = v;
-    s[3] = s[2];
-    s[2] = y;
-    return y;
-}
-
 void ReverbEngine::raiseLevel(float peak) {
     if (owner != nullptr) owner->level = std::max(owner->level, peak);
 }
@@ -47,10 +32,16 @@ void ReverbEngine::cleanSmoothState() {
         if (exponentIsZero(s)) s = 0.0f;
 }
 
-void ReverbEngine::latchFlush(int flush) {
+void ReverbEngine::latchFlush(int flush, bool preDelayInPath) {
     if (!flushLatched) flushLatched = (flush != 0);
     if (!flushLatched) return;
+    // A line out of the signal path is never written again, so whatever it still holds (from before
+    // "Pre Delay" went to 0, or from the echo of another mode) would hold the tail open forever.
     bool silent = true;
+    if (!preDelayInPath) {
+        tailTrimArmed = true;
+        return;
+    }
     for (int32_t i = 0; i < preDelayLine.length && silent; ++i) {
         const double v = preDelayLine.samples[i];
         silent = (v >= -kTiny && v <= kTiny);
@@ -76,39 +67,67 @@ void ReverbEngine::meterInput(const float* inLeft, const float* inRight, int fra
     cleanSmoothState();
 }
 
-void ReverbEngine::makeMono(const float* inLeft, const float* inRight, int frames, int stride) {
-    if (monoCapacity < frames) {
+float* ReverbEngine::growScratch(int32_t count) {
+    if (monoCapacity < count) {
+        // The old buffer goes first, so that the peak footprint stays one buffer.
         monoBuffer.reset();
-        monoBuffer.reset(new float[frames]);
-        monoCapacity = frames;
+        monoBuffer.reset(new float[count]);
+        monoCapacity = count;
     }
+    return monoBuffer.get();
+}
+
+void ReverbEngine::makeMono(const float* inLeft, const float* inRight, int frames, int stride) {
+    float* mono = growScratch(frames);
     const float gain = static_cast<float>(inputGain);
     for (int i = 0; i < frames; ++i) {
         const float l = finiteOrZero(inLeft[i * stride]);
         const float r = finiteOrZero(inRight[i * stride]);
-        monoBuffer[i] = (l + r) * 0.5f * gain;
+        mono[i] = (l + r) * 0.5f * gain;
     }
 }
 
-void ReverbEngine::filterMono(int frames) {
-    for (int s = 0; s < 3; ++s) ProcessMono(filterSections[s], monoBuffer.get(), frames);
+namespace {
+
+bool isPassThrough(const BiquadSection& s) {
+    return s.b0 == 1.0 && s.b1 == 0.0 && s.b2 == 0.0 && s.a1 == 0.0 && s.a2 == 0.0;
 }
 
-void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
-                             int frame, int stride, int accumulate, double wetLeft, double wetRight) {
-    const int at = frame * stride;
-    const float l = static_cast<float>(wetLeft * wetGain + finiteOrZero(inLeft[at]) * dryGain);
-    const float r = static_cast<float>(wetRight * wetGain + finiteOrZero(inRight[at]) * dryGain);
-    if (accumulate) {
-        outLeft[at] += l;
-        outRight[at] += r;
+// What filtering with the pass-through coefficients leaves in one channel's history: outputs equal to the
+// inputs, the last two of them (or the previous ones for a one-sample block).
+void passThroughHistory(double& x1, double& x2, double& y1, double& y2, const float* last, int count, int step) {
+    if (count > 1) {
+        x2 = y2 = flushTiny(last[-step]);
     } else {
-        outLeft[at] = l;
-        outRight[at] = r;
+        x2 = flushTiny(x1);
+        y2 = flushTiny(y1);
     }
-    if (meterSource == 2) {
-        const float v = static_cast<float>(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetGain);
-        wetPeak_ = std::max(wetPeak_, smooth(v));
+    x1 = y1 = flushTiny(last[0]);
+}
+
+}  // namespace
+
+// A section set to pass-through leaves the samples as they are, so it is skipped; only its history moves on.
+void ReverbEngine::filterMono(int frames) {
+    float* mono = monoBuffer.get();
+    for (int i = 0; i < 3; ++i) {
+        BiquadSection& s = filterSections[i];
+        if (!isPassThrough(s))
+            ProcessMono(s, mono, frames);
+        else
+            passThroughHistory(s.x1L, s.x2L, s.y1L, s.y2L, mono + frames - 1, frames, 1);
+    }
+}
+
+void ReverbEngine::filterStereo(float* frames, int count) {
+    for (int i = 0; i < 3; ++i) {
+        BiquadSection& s = filterSections[i];
+        if (!isPassThrough(s)) {
+            ProcessInterleaved(s, frames, count);
+            continue;
+        }
+        passThroughHistory(s.x1L, s.x2L, s.y1L, s.y2L, frames + 2 * (count - 1), count, 2);
+        passThroughHistory(s.x1R, s.x2R, s.y1R, s.y2R, frames + 2 * (count - 1) + 1, count, 2);
     }
 }
 
@@ -137,30 +156,33 @@ int ReverbEngine::trimmedLength(const float* outLeft, const float* outRight, int
 
 int ReverbEngine::ProcessBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                int frames, int stride, int accumulate, int flush) {
-    if (mode == 3 || mode == 4 || mode == 5)
-        return processConvolution(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
-    return processPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    switch (mode) {
+        case 7:
+            return processEcho(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+        case 2:
+        case 6:
+            return processExtendedPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+        case 3:
+        case 4:
+        case 5:
+            return processConvolution(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+        default:
+            return processPlate(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    }
 }
 
-int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
-                               int frames, int stride, int accumulate, int flush) {
-    latchFlush(flush);
+int ReverbEngine::processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                             int frames, int stride, int accumulate, int flush) {
+    latchFlush(flush, false);
     if (frames <= 0) return 0;
     decayMeter(frames);
     if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    makeMono(inLeft, inRight, frames, stride);
-    filterMono(frames);
     wetPeak_ = 0.0f;
-    for (int i = 0; i < frames; ++i) {
-        // The plate network is not wired yet: the wet signal is silent.
-        const double wetLeft = 0.0, wetRight = 0.0;
-        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
-    }
+    for (int i = 0; i < frames; ++i) mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, 0.0, 0.0);
     if (meterSource == 2) {
         raiseLevel(wetPeak_);
         cleanSmoothState();
     }
-    flushKernelStates();
     if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);
 }

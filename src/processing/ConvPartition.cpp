@@ -21,6 +21,14 @@ void HistoryRing::Zero() {
     write = start;
 }
 
+void HistoryRing::CopyOut(int32_t age, int32_t n, float* dst) const {
+    int32_t from = static_cast<int32_t>(write - start) - 1 - age;
+    if (from < 0) from += count;
+    const int32_t first = std::min(n, count - from);
+    std::copy(start + from, start + from + first, dst);
+    std::copy(start, start + (n - first), dst + first);
+}
+
 ConvPartition::~ConvPartition() { StopWorker(); }
 
 void ConvPartition::Allocate(int32_t s, int32_t o) {

@@ -6,6 +6,7 @@
 #include <cmath>
 
 #include "engine/ReverbEngine.h"
+#include "processing/BlockFrame.h"
 
 namespace ulvetta {
 
@@ -59,41 +60,51 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
             historyRight.Push(static_cast<float>(cr));
             headLeft = nspsFir(&firLeft, static_cast<float>(cl));
             headRight = nspsFir(&firRight, static_cast<float>(cr));
-            // 6. Partitions due at this frame take a new window and hand over their last result.
+            // 6. Every 32 frames: the partitions due take a new window and hand over their last result,
+            //    and the next 32 output samples of all partitions are summed at once (their play-out
+            //    positions stay aligned to 32, because every size is a multiple of 32).
             const int32_t n = convCounter;
-            if (n != 0 && n % 32 == 0) {
+            const int32_t slot = n % 32;
+            if (slot == 0) {
+                if (n != 0) {
+                    for (int32_t k = 1; k < partitionCount; ++k) {
+                        ConvPartition& p = partitions[k];
+                        if ((n / 32) % (p.size / 32) != 0 || p.offset > n) continue;
+                        const bool worker = p.size >= kWorkerPartition && p.HasWorker();
+                        if (worker) p.WaitDone();
+                        const int32_t N = p.size;
+                        // The finished result becomes the one played; its old buffer takes the next one.
+                        std::swap(p.outputLeft, p.nextLeft);
+                        std::swap(p.outputRight, p.nextRight);
+                        std::copy(p.inputLeft.get() + N, p.inputLeft.get() + 2 * N, p.inputLeft.get());
+                        std::copy(p.inputRight.get() + N, p.inputRight.get() + 2 * N, p.inputRight.get());
+                        // Frames n - offset .. n - offset + N - 1, oldest first; frame n is the newest.
+                        historyLeft.CopyOut(p.offset, N, p.inputLeft.get() + N);
+                        historyRight.CopyOut(p.offset, N, p.inputRight.get() + N);
+                        if (worker)
+                            p.StartJob();
+                        else
+                            p.RunJob();
+                    }
+                }
+                std::fill(std::begin(partSumLeft), std::end(partSumLeft), 0.0);
+                std::fill(std::begin(partSumRight), std::end(partSumRight), 0.0);
                 for (int32_t k = 1; k < partitionCount; ++k) {
                     ConvPartition& p = partitions[k];
-                    if ((n / 32) % (p.size / 32) != 0 || p.offset > n) continue;
-                    const bool worker = p.size >= kWorkerPartition && p.HasWorker();
-                    if (worker) p.WaitDone();
-                    const int32_t N = p.size;
-                    std::copy(p.nextLeft.get(), p.nextLeft.get() + N, p.outputLeft.get());
-                    std::copy(p.nextRight.get(), p.nextRight.get() + N, p.outputRight.get());
-                    std::copy(p.inputLeft.get() + N, p.inputLeft.get() + 2 * N, p.inputLeft.get());
-                    std::copy(p.inputRight.get() + N, p.inputRight.get() + 2 * N, p.inputRight.get());
-                    // Frames n - offset .. n - offset + N - 1, oldest first; frame n is the newest in the ring.
-                    for (int32_t j = 0; j < N; ++j) {
-                        const int32_t age = p.offset - j;
-                        p.inputLeft[N + j] = historyLeft.Back(age);
-                        p.inputRight[N + j] = historyRight.Back(age);
+                    const float* ol = p.outputLeft.get() + p.readPos;
+                    const float* orr = p.outputRight.get() + p.readPos;
+                    for (int j = 0; j < 32; ++j) {
+                        partSumLeft[j] += ol[j];
+                        partSumRight[j] += orr[j];
                     }
-                    if (worker)
-                        p.StartJob();
-                    else
-                        p.RunJob();
+                    p.readPos += 32;
+                    if (p.readPos == p.size) p.readPos = 0;
                 }
             }
             // 7-8. The counter, then the output of the head and every partition.
             ++convCounter;
-            wetLeft = headLeft;
-            wetRight = headRight;
-            for (int32_t k = 1; k < partitionCount; ++k) {
-                ConvPartition& p = partitions[k];
-                wetLeft += p.outputLeft[p.readPos];
-                wetRight += p.outputRight[p.readPos];
-                if (++p.readPos == p.size) p.readPos = 0;
-            }
+            wetLeft = headLeft + partSumLeft[slot];
+            wetRight = headRight + partSumRight[slot];
         }
         // 9-10. Wet meter and mix.
         if (meterSource == 2)

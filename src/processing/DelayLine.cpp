@@ -31,17 +31,27 @@ void Modulator::SetModRate(double f) {
 
 void Modulator::Update() {
     if (rate == -1.0 || sampleRate == -1) return;
-    const double r = sampleRate / rate;
+    // Bounded so that a zero rate (an unmodulated line's table entry) cannot overflow the period.
+    const double r = std::min(sampleRate / rate, 1e9);
     // The nearest integer to r + 0.5 with ties to even: a fractional period is rounded up.
     period = static_cast<int32_t>(r > -0.5 ? std::nearbyint(r + 0.5) : std::nearbyint(r - 0.5));
+    // A rate that is not set up yet (0 Hz sample rate) must not give an empty period: the phase would
+    // leave its range and the excursion would be undefined.
+    period = std::max<int32_t>(period, 1);
     periodLength = period;
     phase = std::min(phase, period - 1);
+    stepSin_ = std::sin(3.141592653589793 / periodLength);
+    stepCos_ = std::cos(3.141592653589793 / periodLength);
+    untilResync_ = 0;
 }
 
-double Modulator::Tick() {
-    const double m = depth * std::sin(3.141592653589793 * phase / periodLength);
-    if (++phase >= period) phase = 0;
-    return m;
+void Modulator::Resync() {
+    constexpr double kPi = 3.141592653589793;
+    const double angle = kPi * phase / periodLength;
+    sine_ = std::sin(angle);
+    cosine_ = std::cos(angle);
+    // Restart exactly at every wrap to phase 0, and at least every kResyncInterval samples.
+    untilResync_ = std::min(kResyncInterval, period - phase);
 }
 
 void DelayLine::ConfigureLine(int sampleRate, int roomSize, int baseLength, double g, int depth, double rate,

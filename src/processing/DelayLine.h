@@ -8,7 +8,12 @@
 
 namespace ulvetta {
 
-// Swings a line's read point over one positive half sine per period.
+// Swings a line's read point over one positive half sine per period: the excursion is
+// depth x sin(pi x phase / periodLength) samples, and the phase wraps to 0 at period.
+//
+// The sine is advanced by a rotation (four multiplications a sample) and recomputed exactly from the phase
+// every kResyncInterval samples, at each wrap and after a change of period; the accumulated rounding stays
+// below 1e-13 of the depth. The phase is only moved by Tick, Advance and the period update.
 struct Modulator {
     double rate = -1.0;          // Hz; -1 until set
     int32_t sampleRate = -1;     // Hz; -1 until set
@@ -20,11 +25,34 @@ struct Modulator {
     void SetModSampleRate(int32_t r);
     void SetModRate(double f);
     void SetModDepth(int32_t d) { depth = d; }
+
     // The current excursion in samples; advances the phase.
-    double Tick();
+    double Tick() {
+        if (untilResync_ <= 0) Resync();
+        const double m = depth * sine_;
+        const double s = sine_ * stepCos_ + cosine_ * stepSin_;
+        cosine_ = cosine_ * stepCos_ - sine_ * stepSin_;
+        sine_ = s;
+        --untilResync_;
+        if (++phase >= period) phase = 0;
+        return m;
+    }
+
+    // Advances the phase without computing the excursion (for a line that is never read modulated); the
+    // next Tick recomputes the sine from the phase.
+    void Advance() {
+        if (++phase >= period) phase = 0;
+        untilResync_ = 0;
+    }
 
 private:
+    static constexpr int32_t kResyncInterval = 256;
     void Update();
+    void Resync();
+
+    // Sine and cosine of pi x phase / periodLength, and of one phase step.
+    double sine_ = 0.0, cosine_ = 1.0, stepSin_ = 0.0, stepCos_ = 1.0;
+    int32_t untilResync_ = 0;  // ticks left before the sine is recomputed from the phase
 };
 
 struct DelayLine {

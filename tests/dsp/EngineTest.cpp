@@ -247,6 +247,7 @@ TEST(BlockProcessor, MetersFollowTheirSource) {
         e.owner = &owner;
         applyDefaults(e, 44100, 0);
         e.SetDryLevel(0.0);
+        e.SetWetLevel(0.0);
         e.SetInputGain(60);  // +6 dB
         e.meterSource = source;
         e.ResetState();
@@ -256,7 +257,7 @@ TEST(BlockProcessor, MetersFollowTheirSource) {
         if (source == 0)
             EXPECT_NEAR(owner.level, 0.5 * std::pow(10.0, 0.3), 0.02);  // input after the input gain
         else
-            EXPECT_EQ(owner.level, 0.0f);  // the output is silent (dry off, network silent)
+            EXPECT_EQ(owner.level, 0.0f);  // the output is silent (dry and wet off)
     }
 }
 
@@ -264,6 +265,7 @@ TEST(BlockProcessor, DryPathPassesInputWithGains) {
     ReverbEngine e;
     applyDefaults(e, 44100, 0);
     e.SetDryLevel(gainOf(-60));
+    e.SetWetLevel(0.0);
     e.ResetState();
     Stereo s(64);
     for (int i = 0; i < 128; ++i) s.in[i] = static_cast<float>(std::sin(i * 0.1));
@@ -283,6 +285,7 @@ TEST(BlockProcessor, FlushTrimsAtTheLastAudibleFrame) {
     ReverbEngine e;
     applyDefaults(e, 44100, 0);
     e.SetPreDelay(0);  // no pre-delay: the trim is armed by the first flush block
+    e.SetWetLevel(0.0);  // the dry path alone shows where the block is cut
     e.ResetState();
     Stereo s(100);
     s.in[2 * 40 + 1] = 0.25f;  // right channel, frame 40

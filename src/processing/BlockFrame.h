@@ -1,0 +1,49 @@
+// Per-frame pieces of the block frame that every kernel calls inside its sample loop, defined inline so
+// that they compile into the kernels' loops: the meter smoother, the wet/dry mix with the wet meter, and
+// the guard against non-finite input.
+#pragma once
+
+#include <algorithm>
+#include <cmath>
+
+#include "engine/ReverbEngine.h"
+
+namespace ulvetta {
+
+// A non-finite input sample (from a faulty upstream source) is taken as silence, so that it can never
+// poison the recirculating state or the mix.
+inline float finiteOrZero(float v) { return std::isfinite(v) ? v : 0.0f; }
+
+// One sample through the meter's 2.1 Hz low-pass (single precision); returns its output.
+inline float ReverbEngine::smooth(float v) {
+    const float* c = smoothCoefs;
+    float* s = smoothState;  // x1, x2, y1, y2
+    const float y = c[0] * v + c[1] * s[0] + c[2] * s[1] - c[3] * s[2] - c[4] * s[3];
+    s[1] = s[0];
+    s[0] = v;
+    s[3] = s[2];
+    s[2] = y;
+    return y;
+}
+
+// Writes (or adds) one output frame: wet x wetGain + dry input x dryGain, rounded to float; runs the wet
+// meter when it is the meter's source.
+inline void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                                    int frame, int stride, int accumulate, double wetLeft, double wetRight) {
+    const int at = frame * stride;
+    const float l = static_cast<float>(wetLeft * wetGain + finiteOrZero(inLeft[at]) * dryGain);
+    const float r = static_cast<float>(wetRight * wetGain + finiteOrZero(inRight[at]) * dryGain);
+    if (accumulate) {
+        outLeft[at] += l;
+        outRight[at] += r;
+    } else {
+        outLeft[at] = l;
+        outRight[at] = r;
+    }
+    if (meterSource == 2) {
+        const float v = static_cast<float>(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetGain);
+        wetPeak_ = std::max(wetPeak_, smooth(v));
+    }
+}
+
+}  // namespace ulvetta

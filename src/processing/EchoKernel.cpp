@@ -1,0 +1,87 @@
+// The diffused echo (mode 7): a stereo feedback echo whose memory is the pre-delay line, holding interleaved
+// left/right frames. Each repeat is darkened by the colour low-pass, fed back with a 0.4 cross-feed between
+// the channels, and the sum of both channels drives the plate tank. The input stage stays stereo. Runs on
+// the streaming thread under the core's lock.
+#include <cmath>
+
+#include "processing/PlateNetwork.h"
+
+namespace ulvetta {
+
+namespace {
+constexpr double kCrossFeed = 0.4;  // share of the other channel's repeat fed back into each channel
+}
+
+int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                              int frames, int stride, int accumulate, int flush) {
+    if (!NetworkReady(*this, 12, 14, false) || preDelayLine.length < 2)
+        return processDry(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+
+    // The echo meters before latching the flush flag.
+    if (frames > 0) {
+        decayMeter(frames);
+        if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
+    }
+    latchFlush(flush, true);
+    if (frames <= 0) return 0;
+
+    // Stereo input stage: gain, then the three filter sections with a state per channel.
+    float* scratch = growScratch(2 * frames);
+    const float gain = static_cast<float>(inputGain);
+    for (int i = 0; i < frames; ++i) {
+        const float l = inLeft[i * stride], r = inRight[i * stride];
+        scratch[2 * i] = (std::isfinite(l) ? l : 0.0f) * gain;
+        scratch[2 * i + 1] = (std::isfinite(r) ? r : 0.0f) * gain;
+    }
+    filterStereo(scratch, frames);
+
+    NetworkViews v;
+    v.Load(*this, 12, 14, false);
+    LineView* lines = v.lines;
+    TapViews& taps = v.taps;
+    double* echo = preDelayLine.samples.get();
+    const int32_t echoLength = preDelayLine.length;
+    int32_t k = preDelayLine.writeIndex;
+    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, feedback = echoFeedback;
+    const double cutoff = colourCutoff;
+    double colourL = colourState, colourR = colourState2, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
+    wetPeak_ = 0.0f;
+    for (int i = 0; i < frames; ++i) {
+        int32_t k1 = k + 1;
+        if (k1 >= echoLength) k1 -= echoLength;
+        const double cL = ColourStep(colourL, echo[k], cutoff);
+        const double cR = ColourStep(colourR, echo[k1], cutoff);
+
+        const double q = Diffuse(lines, (cL + cR) * dc);
+        const double u = decayK * Oldest(lines[11]) + q;
+        WriteOnly(lines[7], TankHalf(lines, 4, u, false, dc, decayK, dampK, dampLeft));
+        const double u2 = decayK * Oldest(lines[7]) + q;
+        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
+        StepTaps(taps, 14);
+        const double tankLeft = PlateTapsLeft(lines, taps);
+        const double tankRight = PlateTapsRight(lines, taps);
+
+        echo[k] = NoDenormal(scratch[2 * i] + feedback * (cL + kCrossFeed * cR));
+        k = k1;
+        echo[k] = NoDenormal(scratch[2 * i + 1] + feedback * (cR + kCrossFeed * cL));
+        if (++k == echoLength) k = 0;
+
+        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, tankLeft + cL, tankRight + cR);
+    }
+    v.Store(*this);
+    preDelayLine.writeIndex = k;
+    colourState = colourL;
+    colourState2 = colourR;
+    dampingStateLeft = dampLeft;
+    dampingStateRight = dampRight;
+    if (meterSource == 2) {
+        raiseLevel(wetPeak_);
+        cleanSmoothState();
+    }
+    flushKernelStates();
+    colourState2 = flushTiny(colourState2);
+    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
+    return trimmedLength(outLeft, outRight, frames, stride);
+}
+
+}  // namespace ulvetta

@@ -1,0 +1,81 @@
+// The plate (modes 0 and 1, and any mode value not dispatched elsewhere): a figure-of-eight tank fed by a
+// coloured, pre-delayed and diffused mono input, with seven output taps per side plus an early-reflection
+// path per side. Runs on the streaming thread under the core's lock; allocation-free.
+#include "engine/NetworkTables.h"
+#include "processing/PlateNetwork.h"
+
+namespace ulvetta {
+
+bool NetworkReady(const ReverbEngine& e, int lineCount, int tapCount, bool early) {
+    for (int i = 0; i < lineCount; ++i)
+        if (!e.delayLines[i].configured()) return false;
+    if (early)
+        for (const DelayLine& l : e.earlyLines)
+            if (!l.configured()) return false;
+    for (int i = 0; i < tapCount; ++i) {
+        const OutputTap& t = e.outputTaps[i];
+        if (t.length != e.delayLines[network::kTapLine[i]].length || t.index < 0 || t.index >= t.length)
+            return false;
+    }
+    return true;
+}
+
+int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                               int frames, int stride, int accumulate, int flush) {
+    if (!NetworkReady(*this, 12, 14, true))
+        return processDry(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+
+    latchFlush(flush, preDelayOn);
+    if (frames <= 0) return 0;
+    decayMeter(frames);
+    if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
+    makeMono(inLeft, inRight, frames, stride);
+    filterMono(frames);
+
+    NetworkViews v;
+    v.Load(*this, 12, 14, true);
+    LineView* lines = v.lines;
+    LineView* early = v.early;
+    TapViews& taps = v.taps;
+    PreDelayView pre = ViewOf(preDelayLine);
+    const bool usePreDelay = preDelayOn && pre.length > 0;
+    const bool crossfade = (diffusion != 100);
+    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, cutoff = colourCutoff;
+    const double eGain = earlyGain;
+    double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
+    const float* mono = monoBuffer.get();
+    wetPeak_ = 0.0f;
+    for (int i = 0; i < frames; ++i) {
+        const double c = ColourStep(colour, mono[i], cutoff);
+        const double eL = EarlyLeft(early, c) * eGain;
+        const double eR = EarlyRight(early, c) * eGain;
+        const double p = usePreDelay ? PreDelayStep(pre, c) : c;
+        double d = Diffuse(lines, p);
+        if (crossfade) d = dc * d + (1.0 - dc) * p;
+
+        // Left half, fed back from the right half's end line; then the right half, fed from the left's.
+        const double u = decayK * Oldest(lines[11]) + d;
+        WriteOnly(lines[7], TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampLeft));
+        const double u2 = decayK * Oldest(lines[7]) + d;
+        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
+
+        StepTaps(taps, 14);
+        const double wetLeft = PlateTapsLeft(lines, taps) + eL;
+        const double wetRight = PlateTapsRight(lines, taps) + eR;
+        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
+    }
+    v.Store(*this);
+    StoreIndex(preDelayLine, pre);
+    colourState = colour;
+    dampingStateLeft = dampLeft;
+    dampingStateRight = dampRight;
+    if (meterSource == 2) {
+        raiseLevel(wetPeak_);
+        cleanSmoothState();
+    }
+    flushKernelStates();
+    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
+    return trimmedLength(outLeft, outRight, frames, stride);
+}
+
+}  // namespace ulvetta
