@@ -89,7 +89,22 @@ void multiplyPairs(const float* src, float* dst, std::size_t pairs) {
     for (; j < pairs; ++j) multiplyPairScalar(src + 2 * j, dst + 2 * j);
 }
 
-const FftKernels kKernels{&complexFft, &splitForward, &splitInverse, &multiplyPairs};
+double dot8(const float* h, const float* w, std::size_t n) {
+    __m256d a0 = _mm256_setzero_pd(), a1 = a0;  // sums 0-3 and 4-7
+    for (std::size_t i = 0; i < n; i += 8) {
+        const __m256 hv = _mm256_loadu_ps(h + i), wv = _mm256_loadu_ps(w + i);
+        a0 = _mm256_add_pd(a0, _mm256_mul_pd(_mm256_cvtps_pd(_mm256_castps256_ps128(hv)),
+                                             _mm256_cvtps_pd(_mm256_castps256_ps128(wv))));
+        a1 = _mm256_add_pd(a1, _mm256_mul_pd(_mm256_cvtps_pd(_mm256_extractf128_ps(hv, 1)),
+                                             _mm256_cvtps_pd(_mm256_extractf128_ps(wv, 1))));
+    }
+    double acc[8];
+    _mm256_storeu_pd(acc, a0);
+    _mm256_storeu_pd(acc + 4, a1);
+    return combine8(acc);
+}
+
+const FftKernels kKernels{&complexFft, &splitForward, &splitInverse, &multiplyPairs, &dot8};
 
 }  // namespace
 

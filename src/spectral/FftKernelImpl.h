@@ -311,6 +311,15 @@ void splitInverseT(const FftTables& t, float* x, float scale) {
 }
 
 // dst[j] *= src[j] for one complex value, in double precision.
+inline double combine8(const double* a) { return ((a[0] + a[1]) + (a[2] + a[3])) + ((a[4] + a[5]) + (a[6] + a[7])); }
+
+inline double dot8Scalar(const float* h, const float* w, std::size_t n) {
+    double acc[8] = {};
+    for (std::size_t i = 0; i < n; i += 8)
+        for (int k = 0; k < 8; ++k) acc[k] += double(h[i + k]) * w[i + k];
+    return combine8(acc);
+}
+
 inline void multiplyPairScalar(const float* src, float* dst) {
     const double a = dst[0], b = dst[1], c = src[0], d = src[1];
     dst[0] = static_cast<float>(a * c - b * d);

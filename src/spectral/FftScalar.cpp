@@ -15,7 +15,7 @@ void multiplyPairs(const float* src, float* dst, std::size_t pairs) {
     for (std::size_t j = 0; j < pairs; ++j) multiplyPairScalar(src + 2 * j, dst + 2 * j);
 }
 
-const FftKernels kKernels{&complexFft, &splitForward, &splitInverse, &multiplyPairs};
+const FftKernels kKernels{&complexFft, &splitForward, &splitInverse, &multiplyPairs, &dot8Scalar};
 
 }  // namespace
 

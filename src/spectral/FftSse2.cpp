@@ -88,7 +88,25 @@ void multiplyPairs(const float* src, float* dst, std::size_t pairs) {
     }
 }
 
-const FftKernels kKernels{&complexFft, &splitForward, &splitInverse, &multiplyPairs};
+double dot8(const float* h, const float* w, std::size_t n) {
+    __m128d a0 = _mm_setzero_pd(), a1 = a0, a2 = a0, a3 = a0;  // sums 0-1, 2-3, 4-5, 6-7
+    for (std::size_t i = 0; i < n; i += 8) {
+        const __m128 h0 = _mm_loadu_ps(h + i), h1 = _mm_loadu_ps(h + i + 4);
+        const __m128 w0 = _mm_loadu_ps(w + i), w1 = _mm_loadu_ps(w + i + 4);
+        a0 = _mm_add_pd(a0, _mm_mul_pd(_mm_cvtps_pd(h0), _mm_cvtps_pd(w0)));
+        a1 = _mm_add_pd(a1, _mm_mul_pd(_mm_cvtps_pd(_mm_movehl_ps(h0, h0)), _mm_cvtps_pd(_mm_movehl_ps(w0, w0))));
+        a2 = _mm_add_pd(a2, _mm_mul_pd(_mm_cvtps_pd(h1), _mm_cvtps_pd(w1)));
+        a3 = _mm_add_pd(a3, _mm_mul_pd(_mm_cvtps_pd(_mm_movehl_ps(h1, h1)), _mm_cvtps_pd(_mm_movehl_ps(w1, w1))));
+    }
+    alignas(16) double acc[8];
+    _mm_store_pd(acc, a0);
+    _mm_store_pd(acc + 2, a1);
+    _mm_store_pd(acc + 4, a2);
+    _mm_store_pd(acc + 6, a3);
+    return combine8(acc);
+}
+
+const FftKernels kKernels{&complexFft, &splitForward, &splitInverse, &multiplyPairs, &dot8};
 
 }  // namespace
 

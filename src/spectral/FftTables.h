@@ -51,6 +51,10 @@ struct FftKernels {
     void (*splitInverse)(const FftTables& t, float* data, float scale);
     // pairs complex products dst[j] *= src[j] in double precision, j counted in complex values.
     void (*multiplyPairs)(const float* src, float* dst, std::size_t pairs);
+    // The FIR dot product sum h[i] w[i], i < n (a multiple of 8), in double precision with eight running
+    // sums (sum k takes the i with i mod 8 = k), combined as ((s0 + s1) + (s2 + s3)) + ((s4 + s5) + (s6 + s7)).
+    // The same additions in the same order on every instruction set.
+    double (*dot8)(const float* h, const float* w, std::size_t n);
 };
 
 enum class Isa { Scalar, Sse2, Avx2 };

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "spectral/FftTables.h"
 #include "spectral/Nsp.h"
 #include "spectral/NspContext.h"
 
@@ -92,12 +93,8 @@ float nspsFir(FirState* state, float sample) {
     w[state->dlyLen] = sample;
     // Each product of two floats is exact in double. Eight running sums (so the additions need not wait on
     // each other) up to tapsLen8, then the rest; the total is rounded to float once.
-    double acc[8] = {};
-    int i = 0;
-    for (; i < state->tapsLen8; i += 8)
-        for (int k = 0; k < 8; ++k) acc[k] += double(h[i + k]) * w[i + k];
-    double y = ((acc[0] + acc[1]) + (acc[2] + acc[3])) + ((acc[4] + acc[5]) + (acc[6] + acc[7]));
-    for (; i < state->tapsLen; ++i) y += double(h[i]) * w[i];
+    double y = spectral::activeKernels().dot8(h, w, std::size_t(state->tapsLen8));
+    for (int i = state->tapsLen8; i < state->tapsLen; ++i) y += double(h[i]) * w[i];
     ++state->window;
     if (state->window == state->windowEnd) {
         std::memmove(state->buffer, state->windowEnd, std::size_t(state->dlyLen) * sizeof(float));

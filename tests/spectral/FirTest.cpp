@@ -91,3 +91,21 @@ TEST(Fir, ReinitialisingReleasesTheOldBuffers) {
     nspFirFree(&s);
     EXPECT_EQ(cap.take().calls, 0);
 }
+
+TEST(Fir, EveryInstructionSetGivesTheSameBits) {
+    std::vector<float> h(64), x(700);
+    for (std::size_t i = 0; i < h.size(); ++i) h[i] = float(std::sin(0.37 * double(i)) * 0.3);
+    for (std::size_t i = 0; i < x.size(); ++i) x[i] = float(std::cos(1.3 * double(i)) + 0.25 * std::sin(0.11 * double(i)));
+    std::vector<std::vector<float>> results;
+    for (spectral::Isa isa : availableIsas()) {
+        IsaScope scope(isa);
+        FirState s;
+        ASSERT_NE(nspsFirInit(h.data(), int(h.size()), nullptr, &s), 0);
+        std::vector<float> y;
+        for (float v : x) y.push_back(nspsFir(&s, v));
+        nspFirFree(&s);
+        results.push_back(y);
+    }
+    ASSERT_FALSE(results.empty());
+    for (const auto& r : results) EXPECT_EQ(r, results.front());
+}
