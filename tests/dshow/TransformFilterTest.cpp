@@ -195,7 +195,7 @@ std::vector<int16_t> Ramp(int frames) {
     std::vector<int16_t> v(2 * frames);
     for (int i = 0; i < frames; ++i) {
         v[2 * i] = static_cast<int16_t>(i % 2000 + 1);
-        v[2 * i + 1] = static_cast<int16_t>(-(i % 1500) - 1);
+        v[2 * i + 1] = static_cast<int16_t>(i % 1500 + 1);  // same sign: the mono sum that feeds the reverb is not zero
     }
     return v;
 }

@@ -17,8 +17,8 @@ cd "$out"
 make_input() {  # file rate encoding...
   local file="$1" rate="$2"
   shift 2
-  sox -D -n -r "$rate" -c 2 "$@" "$file" synth 0.5 sine 440 sine 660 fade q 0.01 0.5 0.3 gain -8 \
-    : synth 0.15 pinknoise fade q 0.005 0.15 0.1 gain -12
+  sox -D -n -r "$rate" -c 2 "$@" "$file" synth 0.5 sine 440 sine 660 fade q 0.01 0.5 0.3 gain -14 \
+    : synth 0.15 pinknoise fade q 0.005 0.15 0.1 gain -18
 }
 
 : > cases.txt
@@ -28,12 +28,16 @@ add_case() {  # rate format algorithm
   local enc=(-b 16)
   [ "$format" = f32 ] && enc=(-e floating-point -b 32)
   make_input "$name.wav" "$rate" "${enc[@]}"
-  "$cli" presets save "$name" --algorithm "$algorithm" --set "Output Level Wet=-6" --dir presets >/dev/null
+  "$cli" presets save "$name" --algorithm "$algorithm" --set "Output Level Wet=-12" --dir presets >/dev/null
   cp "presets/$name.stp" "$name.stp"
   # The WAVE parser delivers 40 ms per sample; the renderer uses the same block size.
   local block=$((rate * 40 / 1000))
   "$cli" render "$name.wav" "$name-ref.wav" --state "$name.stp" --block "$block"
-  sox "$name-ref.wav" -t f32 "$name-ref.raw"
+  # sox reads through 32-bit integers: a reference beyond full scale would be clipped, so refuse one.
+  if sox "$name-ref.wav" -t f32 "$name-ref.raw" 2>&1 | grep -qi clip; then
+    echo "the reference render of $name exceeds full scale; lower the test input" >&2
+    exit 1
+  fi
   echo "$name $name.wav $name.stp $name-ref.raw" >> cases.txt
 }
 

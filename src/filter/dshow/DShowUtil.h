@@ -33,6 +33,18 @@ inline int64_t RefTimeToSamples(REFERENCE_TIME t, uint32_t rate) {
     return (t / 10000) * static_cast<int64_t>(rate) / 1000;
 }
 
+// Holds a critical section for its lifetime.
+class CritSecLock {
+public:
+    explicit CritSecLock(CRITICAL_SECTION& cs) : cs_(cs) { EnterCriticalSection(&cs_); }
+    ~CritSecLock() { LeaveCriticalSection(&cs_); }
+    CritSecLock(const CritSecLock&) = delete;
+    CritSecLock& operator=(const CritSecLock&) = delete;
+
+private:
+    CRITICAL_SECTION& cs_;
+};
+
 // Holds one reference to a COM object.
 template <class T>
 class ComRef {

@@ -1,5 +1,7 @@
 #include "filter/dshow/ReverbControl.h"
 
+#include "filter/dshow/DShowUtil.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstring>
@@ -9,14 +11,6 @@ namespace dshow {
 
 namespace {
 
-class Lock {
-public:
-    explicit Lock(CRITICAL_SECTION& cs) : cs_(cs) { EnterCriticalSection(&cs_); }
-    ~Lock() { LeaveCriticalSection(&cs_); }
-
-private:
-    CRITICAL_SECTION& cs_;
-};
 
 // A produced float sample as 16-bit PCM: scaled, truncated toward zero, clamped (never wrapped).
 int16_t ToPcm16(float v) {
@@ -49,14 +43,14 @@ ReverbControl::~ReverbControl() {
 
 STDMETHODIMP ReverbControl::GetOption(BYTE* out) {
     if (out == nullptr) return E_POINTER;
-    Lock g(lock_);
+    CritSecLock g(lock_);
     *out = option_;
     return S_OK;
 }
 
 STDMETHODIMP ReverbControl::SetOption(const BYTE* in) {
     if (in == nullptr) return E_POINTER;
-    Lock g(lock_);
+    CritSecLock g(lock_);
     option_ = *in;
     optionChanged_ = true;
     dirty_ = true;
@@ -64,13 +58,13 @@ STDMETHODIMP ReverbControl::SetOption(const BYTE* in) {
 }
 
 bool ReverbControl::IsDirty() {
-    Lock g(lock_);
+    CritSecLock g(lock_);
     return dirty_;
 }
 
 STDMETHODIMP ReverbControl::GetFormat(WAVEFORMATEX* out, int direction) {
     if (out == nullptr) return E_POINTER;
-    Lock g(lock_);
+    CritSecLock g(lock_);
     if (direction == 0 && inKnown_) {
         *out = *inFormat_;
         return S_OK;
@@ -83,7 +77,7 @@ STDMETHODIMP ReverbControl::GetFormat(WAVEFORMATEX* out, int direction) {
 }
 
 STDMETHODIMP ReverbControl::RegisterWindow(HWND window, WORD commandId) {
-    Lock g(lock_);
+    CritSecLock g(lock_);
     Window* target = nullptr;
     for (Window& w : windows_)
         if (w.window == window) target = &w;
@@ -103,7 +97,7 @@ IPersistStream* STDMETHODCALLTYPE ReverbControl::GetPersistStream() {
 
 void ReverbControl::FormatChanged(int direction) {
     {
-        Lock g(lock_);
+        CritSecLock g(lock_);
         (direction == 0 ? inKnown_ : outKnown_) = true;
     }
     const WAVEFORMATEX* f = direction == 0 ? inFormat_ : outFormat_;
@@ -111,34 +105,32 @@ void ReverbControl::FormatChanged(int direction) {
     const int outChannels = outKnown_ ? outFormat_->nChannels : 2;
     core_->setFormat(static_cast<float>(f->nSamplesPerSec), 0, inChannels, outChannels);
     core_->applyAll();
-    Lock g(lock_);
-    for (Window& w : windows_) {
-        if (w.window == nullptr) continue;
-        if (!IsWindow(w.window)) {
-            w.window = nullptr;
-            w.id = 0;
-            continue;
-        }
-        PostMessageW(w.window, WM_COMMAND, MAKEWPARAM(w.id, direction), 0);
-    }
+    ForEachWindow([direction](HWND window, WORD id) { PostMessageW(window, WM_COMMAND, MAKEWPARAM(id, direction), 0); });
 }
 
 void ReverbControl::RedrawWindows() {
-    Lock g(lock_);
+    ForEachWindow([](HWND window, WORD) {
+        RedrawWindow(window, nullptr, nullptr, RDW_INVALIDATE | RDW_ERASE | RDW_INTERNALPAINT | RDW_UPDATENOW);
+    });
+}
+
+template <class F>
+void ReverbControl::ForEachWindow(F notify) {
+    CritSecLock g(lock_);
     for (Window& w : windows_) {
         if (w.window == nullptr) continue;
-        if (!IsWindow(w.window)) {
+        if (!IsWindow(w.window)) {  // gone: its entry is freed instead
             w.window = nullptr;
             w.id = 0;
             continue;
         }
-        RedrawWindow(w.window, nullptr, nullptr, RDW_INVALIDATE | RDW_ERASE | RDW_INTERNALPAINT | RDW_UPDATENOW);
+        notify(w.window, w.id);
     }
 }
 
 bool ReverbControl::StartStreaming() {
     {
-        Lock g(lock_);
+        CritSecLock g(lock_);
         inKnown_ = outKnown_ = true;
         optionChanged_ = false;
         started_ = true;

@@ -71,6 +71,9 @@ public:
 private:
     void begin() override;
     void end() override;
+    // Calls notify(window, id) for every registered window that still exists, clearing the others.
+    template <class F>
+    void ForEachWindow(F notify);
 
     IUnknown* outer_;
     IPersistStream* persist_;

@@ -21,14 +21,6 @@ namespace dshow {
 
 namespace {
 
-class Lock {
-public:
-    explicit Lock(CRITICAL_SECTION& cs) : cs_(cs) { EnterCriticalSection(&cs_); }
-    ~Lock() { LeaveCriticalSection(&cs_); }
-
-private:
-    CRITICAL_SECTION& cs_;
-};
 
 constexpr DWORD kMediaParamCount = kSoundParamCount;
 // The longest tail the drain delivers before it ends the stream regardless, in seconds of audio: a
@@ -288,7 +280,7 @@ HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, REFER
     const int step = std::max<int>(1, static_cast<int>(inputFormat_.nSamplesPerSec / 200));
     bool active;
     {
-        Lock g(paramLock_);
+        CritSecLock g(paramLock_);
         auto& segs = control_->segments;
         segs.erase(std::remove_if(segs.begin(), segs.end(),
                                   [&](const EnvelopeSegment& s) { return s.endSample < blockPosition_; }),
@@ -327,7 +319,7 @@ HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, REFER
                 length = std::min(length, step);
                 const int64_t t = blockPosition_ + offset;
                 const int64_t next = std::min<int64_t>(frames - offset - length, step);
-                Lock g(paramLock_);
+                CritSecLock g(paramLock_);
                 for (const EnvelopeSegment& s : control_->segments) {
                     if (t < s.startSample || t > s.endSample) continue;
                     ReverbCore* core = control_->GetCore();
@@ -504,7 +496,7 @@ STDMETHODIMP ReverbFilter::GetParamCount(DWORD* count) {
 STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (info == nullptr) return E_POINTER;
-    Lock g(paramLock_);
+    CritSecLock g(paramLock_);
     ReverbCore* core = control_->GetCore();
     ParamDesc d;
     if (!core->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
@@ -536,7 +528,7 @@ STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
 STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (text == nullptr) return E_POINTER;
-    Lock g(paramLock_);
+    CritSecLock g(paramLock_);
     ParamDesc d;
     if (!control_->GetCore()->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
     constexpr int kChars = 256;  // a 512-byte block
@@ -590,7 +582,7 @@ STDMETHODIMP ReverbFilter::GetParam(DWORD index, MP_DATA* value) {
 
 STDMETHODIMP ReverbFilter::SetParam(DWORD index, MP_DATA value) {
     if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
-    Lock g(paramLock_);
+    CritSecLock g(paramLock_);
     const DWORD first = index == kAllParams ? 0 : index;
     const DWORD last = index == kAllParams ? kMediaParamCount - 1 : index;
     for (DWORD k = first; k <= last; ++k) {
@@ -616,7 +608,7 @@ void ReverbFilter::RemoveSegments(int32_t id, int64_t s0, int64_t s1) {
 STDMETHODIMP ReverbFilter::AddEnvelope(DWORD index, DWORD count, MP_ENVELOPE_SEGMENT* segments) {
     if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
     if (segments == nullptr) return E_POINTER;
-    Lock g(paramLock_);
+    CritSecLock g(paramLock_);
     // Times become samples at the input rate: without an input format there is nothing to convert with.
     const DWORD rate = inputFormat_.nSamplesPerSec;
     if (rate == 0) return VFW_E_NOT_CONNECTED;
@@ -637,7 +629,7 @@ STDMETHODIMP ReverbFilter::AddEnvelope(DWORD index, DWORD count, MP_ENVELOPE_SEG
 
 STDMETHODIMP ReverbFilter::FlushEnvelope(DWORD index, REFERENCE_TIME start, REFERENCE_TIME stop) {
     if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
-    Lock g(paramLock_);
+    CritSecLock g(paramLock_);
     const DWORD rate = inputFormat_.nSamplesPerSec;
     if (rate == 0) return S_OK;
     const int64_t s0 = RefTimeToSamples(start, rate), s1 = RefTimeToSamples(stop, rate);

@@ -9,17 +9,6 @@ namespace dshow {
 
 namespace {
 
-// Scoped critical section.
-class Lock {
-public:
-    explicit Lock(CRITICAL_SECTION& cs) : cs_(cs) { EnterCriticalSection(&cs_); }
-    ~Lock() { LeaveCriticalSection(&cs_); }
-    Lock(const Lock&) = delete;
-    Lock& operator=(const Lock&) = delete;
-
-private:
-    CRITICAL_SECTION& cs_;
-};
 
 // Enumerates the filter's two pins; holds a reference on the filter.
 class PinEnumerator : public IEnumPins {
@@ -200,7 +189,7 @@ void TransformPin::ClearConnection() {
 }
 
 STDMETHODIMP TransformPin::Disconnect() {
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     if (filter_->State() != State_Stopped) return VFW_E_NOT_STOPPED;
     if (!IsConnected()) return S_FALSE;
     filter_->BreakConnect(dir_);
@@ -210,7 +199,7 @@ STDMETHODIMP TransformPin::Disconnect() {
 
 STDMETHODIMP TransformPin::ConnectedTo(IPin** pin) {
     if (pin == nullptr) return E_POINTER;
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     *pin = connected_.get();
     if (*pin == nullptr) return VFW_E_NOT_CONNECTED;
     (*pin)->AddRef();
@@ -219,7 +208,7 @@ STDMETHODIMP TransformPin::ConnectedTo(IPin** pin) {
 
 STDMETHODIMP TransformPin::ConnectionMediaType(AM_MEDIA_TYPE* mt) {
     if (mt == nullptr) return E_POINTER;
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     if (!IsConnected()) {
         std::memset(mt, 0, sizeof *mt);
         return VFW_E_NOT_CONNECTED;
@@ -290,7 +279,7 @@ STDMETHODIMP TransformInputPin::Connect(IPin*, const AM_MEDIA_TYPE*) { return E_
 
 STDMETHODIMP TransformInputPin::ReceiveConnection(IPin* connector, const AM_MEDIA_TYPE* mt) {
     if (connector == nullptr || mt == nullptr) return E_POINTER;
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     if (IsConnected()) return VFW_E_ALREADY_CONNECTED;
     if (filter_->State() != State_Stopped) return VFW_E_NOT_STOPPED;
     PIN_DIRECTION other;
@@ -319,7 +308,7 @@ STDMETHODIMP TransformInputPin::Disconnect() {
 }
 
 STDMETHODIMP TransformInputPin::EndOfStream() {
-    Lock g(filter_->ReceiveLock());
+    CritSecLock g(filter_->ReceiveLock());
     if (filter_->State() == State_Stopped) return VFW_E_WRONG_STATE;
     if (flushing_) return S_FALSE;
     endOfStream_ = true;
@@ -333,7 +322,7 @@ STDMETHODIMP TransformInputPin::BeginFlush() {
 }
 
 STDMETHODIMP TransformInputPin::EndFlush() {
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     HRESULT hr = filter_->EndFlush();
     flushing_ = false;
     endOfStream_ = false;
@@ -346,7 +335,7 @@ STDMETHODIMP TransformInputPin::NewSegment(REFERENCE_TIME start, REFERENCE_TIME 
 
 STDMETHODIMP TransformInputPin::GetAllocator(IMemAllocator** allocator) {
     if (allocator == nullptr) return E_POINTER;
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     if (!allocator_) {
         HRESULT hr = CoCreateInstance(CLSID_MemoryAllocator, nullptr, CLSCTX_INPROC_SERVER, IID_IMemAllocator,
                                       reinterpret_cast<void**>(allocator_.put()));
@@ -359,7 +348,7 @@ STDMETHODIMP TransformInputPin::GetAllocator(IMemAllocator** allocator) {
 
 STDMETHODIMP TransformInputPin::NotifyAllocator(IMemAllocator* allocator, BOOL) {
     if (allocator == nullptr) return E_POINTER;
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     allocator_.reset(allocator);
     return S_OK;
 }
@@ -368,7 +357,7 @@ STDMETHODIMP TransformInputPin::GetAllocatorRequirements(ALLOCATOR_PROPERTIES*) 
 
 STDMETHODIMP TransformInputPin::Receive(IMediaSample* sample) {
     if (sample == nullptr) return E_POINTER;
-    Lock g(filter_->ReceiveLock());
+    CritSecLock g(filter_->ReceiveLock());
     if (filter_->State() == State_Stopped) return VFW_E_WRONG_STATE;
     if (flushing_) return S_FALSE;
     if (endOfStream_) return VFW_E_SAMPLE_REJECTED_EOS;
@@ -455,7 +444,7 @@ HRESULT TransformOutputPin::TryConnect(IPin* receivePin, const AM_MEDIA_TYPE* mt
 
 STDMETHODIMP TransformOutputPin::Connect(IPin* receivePin, const AM_MEDIA_TYPE* mt) {
     if (receivePin == nullptr) return E_POINTER;
-    Lock g(filter_->StateLock());
+    CritSecLock g(filter_->StateLock());
     if (IsConnected()) return VFW_E_ALREADY_CONNECTED;
     if (filter_->State() != State_Stopped) return VFW_E_NOT_STOPPED;
     HRESULT hr = filter_->CheckConnect(PINDIR_OUTPUT, receivePin);
@@ -661,7 +650,7 @@ STDMETHODIMP TransformFilter::GetClassID(CLSID* clsid) {
 }
 
 STDMETHODIMP TransformFilter::Stop() {
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     if (state_ == State_Stopped) return S_OK;
     GetPin(0);
     if (!input_->IsConnected() || !output_->IsConnected()) {
@@ -671,7 +660,7 @@ STDMETHODIMP TransformFilter::Stop() {
     }
     // Decommit the input first so that a streaming thread waiting for a buffer lets go of the receive lock.
     input_->Inactive();
-    Lock r(receiveLock_);
+    CritSecLock r(receiveLock_);
     output_->Inactive();
     HRESULT hr = StopStreaming();
     if (SUCCEEDED(hr)) {
@@ -682,7 +671,7 @@ STDMETHODIMP TransformFilter::Stop() {
 }
 
 STDMETHODIMP TransformFilter::Pause() {
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     GetPin(0);
     HRESULT hr = S_OK;
     if (state_ == State_Paused) {
@@ -698,7 +687,7 @@ STDMETHODIMP TransformFilter::Pause() {
         state_ = State_Paused;
     } else {
         if (state_ == State_Stopped) {
-            Lock r(receiveLock_);
+            CritSecLock r(receiveLock_);
             hr = StartStreaming();
             if (SUCCEEDED(hr)) hr = output_->Active();
             if (SUCCEEDED(hr)) input_->Active();
@@ -709,7 +698,7 @@ STDMETHODIMP TransformFilter::Pause() {
 }
 
 STDMETHODIMP TransformFilter::Run(REFERENCE_TIME start) {
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     start_ = start;
     if (state_ == State_Stopped) {
         HRESULT hr = Pause();
@@ -726,7 +715,7 @@ STDMETHODIMP TransformFilter::GetState(DWORD, FILTER_STATE* state) {
 }
 
 STDMETHODIMP TransformFilter::SetSyncSource(IReferenceClock* clock) {
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     if (clock) clock->AddRef();
     if (clock_) clock_->Release();
     clock_ = clock;
@@ -735,7 +724,7 @@ STDMETHODIMP TransformFilter::SetSyncSource(IReferenceClock* clock) {
 
 STDMETHODIMP TransformFilter::GetSyncSource(IReferenceClock** clock) {
     if (clock == nullptr) return E_POINTER;
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     *clock = clock_;
     if (clock_) clock_->AddRef();
     return S_OK;
@@ -764,7 +753,7 @@ STDMETHODIMP TransformFilter::FindPin(LPCWSTR id, IPin** pin) {
 
 STDMETHODIMP TransformFilter::QueryFilterInfo(FILTER_INFO* info) {
     if (info == nullptr) return E_POINTER;
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     wcsncpy(info->achName, name_, MAX_FILTER_NAME - 1);
     info->achName[MAX_FILTER_NAME - 1] = L'\0';
     info->pGraph = graph_;
@@ -773,7 +762,7 @@ STDMETHODIMP TransformFilter::QueryFilterInfo(FILTER_INFO* info) {
 }
 
 STDMETHODIMP TransformFilter::JoinFilterGraph(IFilterGraph* graph, LPCWSTR name) {
-    Lock g(stateLock_);
+    CritSecLock g(stateLock_);
     graph_ = graph;
     name_[0] = L'\0';
     if (name) {
