@@ -32,7 +32,8 @@ struct Room {
     double lowRatio;    // T60 of the low band relative to the middle
     double highRatio;   // T60 of the high band relative to the middle
     double highLevel;   // level of the high band in the late field (brightness)
-    double lateLevel;   // level of the late field relative to the direct arrival
+    double lateLevel;   // level of the late field relative to the direct arrival (the bright hall's strong
+                        // direct sound stands far above its tail, which keeps its loudness near the others')
     double buildUp;     // time constant of the late field's build-up, seconds
     double peak;        // peak magnitude of the stored response
     int zeroTail;       // frames of exact zeros at the end
@@ -40,7 +41,7 @@ struct Room {
 
 // Stored order: the bright hall, the large room, the auditorium.
 const Room kRooms[3] = {
-    {104830, 0x9E3779B97F4A7C15ull, 2.05, 1.35, 0.60, 1.00, 0.55, 0.030, 0.30, 0},
+    {104830, 0x9E3779B97F4A7C15ull, 2.05, 1.35, 0.60, 1.00, 0.10, 0.030, 0.30, 0},
     {135168, 0xD1B54A32D192ED03ull, 1.95, 1.40, 0.50, 0.55, 0.70, 0.050, 0.064, 5888},
     {103898, 0x94D049BB133111EBull, 1.80, 1.45, 0.45, 0.40, 0.65, 0.040, 0.060, 0},
 };

@@ -67,6 +67,12 @@ TEST(StoredResponses, HaveTheCharacterOfRealRooms) {
         EXPECT_GT(rep.t60_250, rep.t60_1k);
         EXPECT_GT(rep.t60_1k, rep.t60_4k);
         EXPECT_LT(std::fabs(rep.tailCorrelation), 0.3);
+        // Loudness: the gain for a noise-like input, sqrt(sum h^2), stays near unity, so that the factory
+        // settings (wet -10 to -12 dB, dry 0 dB) do not drive full-scale material into clipping.
+        double energy = 0.0;
+        for (float v : l) energy += double(v) * v;
+        EXPECT_GT(std::sqrt(energy), 0.4);
+        EXPECT_LT(std::sqrt(energy), 1.5);
         // Energy from the very first frame; early reflections stand out of the first 80 ms.
         EXPECT_NE(l[0], 0.0f);
         int spikes = 0;
