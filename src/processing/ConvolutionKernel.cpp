@@ -108,9 +108,9 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
         }
         // 9-10. Wet meter and mix.
         if (meterSource == 2)
-            wetPeak = std::max(wetPeak, smooth(static_cast<float>(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetLevel)));
-        const float l = static_cast<float>(wetLeft * wetLevel + finiteOr0(inLeft[at]) * dryLevel);
-        const float r = static_cast<float>(wetRight * wetLevel + finiteOr0(inRight[at]) * dryLevel);
+            wetPeak = std::max(wetPeak, smooth(toOutputFloat(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetLevel)));
+        const float l = toOutputFloat(wetLeft * wetLevel + finiteOr0(inLeft[at]) * dryLevel);
+        const float r = toOutputFloat(wetRight * wetLevel + finiteOr0(inRight[at]) * dryLevel);
         if (accumulate) {
             outLeft[at] += l;
             outRight[at] += r;
