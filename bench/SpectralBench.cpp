@@ -55,14 +55,14 @@ void fftwPair(benchmark::State& state) {
     const int n = 1 << order;
     float* in = fftwf_alloc_real(n);
     float* out = fftwf_alloc_real(n);
-    fftwf_complex* spec = fftwf_alloc_complex(n / 2 + 1);
-    fftwf_plan fwd = fftwf_plan_dft_r2c_1d(n, in, spec, FFTW_MEASURE);
-    fftwf_plan inv = fftwf_plan_dft_c2r_1d(n, spec, out, FFTW_MEASURE);
+    fftwf_complex* spectrum = fftwf_alloc_complex(n / 2 + 1);
+    fftwf_plan fwd = fftwf_plan_dft_r2c_1d(n, in, spectrum, FFTW_MEASURE);
+    fftwf_plan inv = fftwf_plan_dft_c2r_1d(n, spectrum, out, FFTW_MEASURE);
     const std::vector<float> x = noise(std::size_t(n));
     std::copy(x.begin(), x.end(), in);
     for (auto _ : state) {
         fftwf_execute(fwd);
-        fftwf_execute(inv);  // unscaled; it reads only spec, so the input never grows
+        fftwf_execute(inv);  // unscaled; it reads only spectrum, so the input never grows
         benchmark::DoNotOptimize(out);
         benchmark::ClobberMemory();
     }
@@ -70,7 +70,7 @@ void fftwPair(benchmark::State& state) {
     fftwf_destroy_plan(inv);
     fftwf_free(in);
     fftwf_free(out);
-    fftwf_free(spec);
+    fftwf_free(spectrum);
 }
 
 void kissPair(benchmark::State& state) {
@@ -80,10 +80,10 @@ void kissPair(benchmark::State& state) {
     kiss_fftr_cfg inv = kiss_fftr_alloc(n, 1, nullptr, nullptr);
     const std::vector<float> in = noise(std::size_t(n));
     std::vector<float> out(static_cast<std::size_t>(n));
-    std::vector<kiss_fft_cpx> spec(std::size_t(n) / 2 + 1);
+    std::vector<kiss_fft_cpx> spectrum(std::size_t(n) / 2 + 1);
     for (auto _ : state) {
-        kiss_fftr(fwd, in.data(), spec.data());
-        kiss_fftri(inv, spec.data(), out.data());
+        kiss_fftr(fwd, in.data(), spectrum.data());
+        kiss_fftri(inv, spectrum.data(), out.data());
         benchmark::DoNotOptimize(out.data());
         benchmark::ClobberMemory();
     }
