@@ -35,9 +35,9 @@ std::vector<std::size_t> checkedIndices(int order, std::size_t count, unsigned s
 double bound(int order, double rmsOut) { return 2.0 * kEps * (order + 1) * rmsOut; }
 
 std::vector<float> forwardOf(const std::vector<float>& x, int order, int layout) {
-    std::vector<float> spec(x);
-    nspsRealFftl(spec.data(), order, FlagForward | layout);
-    return spec;
+    std::vector<float> spectrum(x);
+    nspsRealFftl(spectrum.data(), order, FlagForward | layout);
+    return spectrum;
 }
 
 }  // namespace
@@ -80,39 +80,39 @@ TEST(RealFftAccuracy, InverseMatchesDirectInverseForEveryOrderAndInstructionSet)
     for (int order = 0; order <= kMaxTestedOrder; ++order) {
         const std::size_t n = std::size_t(1) << order;
         // A random RCPerm spectrum; DC and Nyquist are real by construction of the layout.
-        const std::vector<float> spec = randomFloats(n, seed(200 + order));
+        const std::vector<float> spectrum = randomFloats(n, seed(200 + order));
         const UnitCircle u(n);
         double energy = 0.0;  // sum of |X[k]|^2 over all N bins
         for (std::size_t k = 0; k <= n / 2; ++k) {
-            const double re = permRe(spec.data(), n, k), im = permIm(spec.data(), n, k);
+            const double re = permRe(spectrum.data(), n, k), im = permIm(spectrum.data(), n, k);
             energy += (k == 0 || k == n / 2 ? 1.0 : 2.0) * (re * re + im * im);
         }
-        if (n == 1) energy = double(spec[0]) * spec[0];
+        if (n == 1) energy = double(spectrum[0]) * spectrum[0];
         const double rmsX = std::sqrt(energy) / double(n);  // Parseval: rms of x = ||X|| / N
         const double tol = bound(order, rmsX);
         const std::vector<std::size_t> points = checkedIndices(order, n, 11 * order);
         std::vector<double> ref(points.size());
         for (std::size_t p = 0; p < points.size(); ++p) {
             const std::size_t j = points[p];
-            double sum = permRe(spec.data(), n, 0);
-            if (n > 1) sum += (j % 2 ? -1.0 : 1.0) * permRe(spec.data(), n, n / 2);
+            double sum = permRe(spectrum.data(), n, 0);
+            if (n > 1) sum += (j % 2 ? -1.0 : 1.0) * permRe(spectrum.data(), n, n / 2);
             for (std::size_t k = 1; k < n / 2; ++k) {
                 const std::size_t e = (j * k) % n;
-                sum += 2.0 * (permRe(spec.data(), n, k) * u.c[e] - permIm(spec.data(), n, k) * u.s[e]);
+                sum += 2.0 * (permRe(spectrum.data(), n, k) * u.c[e] - permIm(spectrum.data(), n, k) * u.s[e]);
             }
             ref[p] = sum / double(n);
         }
         std::vector<float> pack(n);
-        pack[0] = spec[0];
+        pack[0] = spectrum[0];
         if (n > 1) {
-            std::memcpy(pack.data() + 1, spec.data() + 2, (n - 2) * sizeof(float));
-            pack[n - 1] = spec[1];
+            std::memcpy(pack.data() + 1, spectrum.data() + 2, (n - 2) * sizeof(float));
+            pack[n - 1] = spectrum[1];
         }
 
         for (Isa isa : availableIsas()) {
             IsaScope scope(isa);
             SCOPED_TRACE(testing::Message() << "order " << order << ", " << isaName(isa));
-            std::vector<float> x(spec), xPack(pack), xRaw(spec);
+            std::vector<float> x(spectrum), xPack(pack), xRaw(spectrum);
             nspsCcsFftl(x.data(), order, FlagInverse | FlagInPerm);
             nspsCcsFftl(xPack.data(), order, FlagInverse | FlagInPack);
             nspsCcsFftl(xRaw.data(), order, FlagInverse | FlagInPerm | FlagNoScale);
