@@ -57,15 +57,15 @@ inline void dftBin(const std::vector<float>& x, const UnitCircle& u, std::size_t
 }
 
 // Real and imaginary part of bin k (0 <= k <= N/2) of a spectrum stored in RCPerm.
-inline float permRe(const float* spec, std::size_t n, std::size_t k) {
-    if (n == 1) return spec[0];
-    if (k == 0) return spec[0];
-    if (k == n / 2) return spec[1];
-    return spec[2 * k];
+inline float permRe(const float* spectrum, std::size_t n, std::size_t k) {
+    if (n == 1) return spectrum[0];
+    if (k == 0) return spectrum[0];
+    if (k == n / 2) return spectrum[1];
+    return spectrum[2 * k];
 }
-inline float permIm(const float* spec, std::size_t n, std::size_t k) {
+inline float permIm(const float* spectrum, std::size_t n, std::size_t k) {
     if (k == 0 || k == n / 2) return 0.0f;
-    return spec[2 * k + 1];
+    return spectrum[2 * k + 1];
 }
 
 // The instruction sets this build and processor can run.
