@@ -72,16 +72,16 @@ ULVETTA_ALWAYS_INLINE double RoundToEven(double v) {
 // (one sample less delay), a negative f towards the older one (one sample more delay), so both weights
 // stay within 0..1 and the read never amplifies. The neighbour is chosen without a branch.
 ULVETTA_ALWAYS_INLINE double ModulatedRead(LineView& l) {
+    // The excursion is never negative (a half sine from 0 to depth): with i its whole part and g its
+    // fraction, the read point lies between the entries i and i + 1 samples newer than the oldest, so
+    // this is the interpolation above without the rounding and the choice of side.
     const double m = l.mod->Tick();
-    const double n = RoundToEven(m);
-    const double f = m - n;
-    const double w = std::fabs(f);
-    int32_t p = l.writeIndex - static_cast<int32_t>(n);
+    const int32_t i = static_cast<int32_t>(m);
+    const double g = m - i;
+    int32_t p = l.writeIndex - i;
     if (p < 0) p += l.length;
-    int32_t q = (f >= 0.0) ? p - 1 : p + 1;
-    q = (q < 0) ? q + l.length : q;
-    q = (q == l.length) ? 0 : q;
-    return (1.0 - w) * l.samples[p] + w * l.samples[q];
+    const int32_t q = (p == 0 ? l.length : p) - 1;
+    return (1.0 - g) * l.samples[p] + g * l.samples[q];
 }
 
 // The line's output before this sample's write: the oldest entry, or the modulated read.
