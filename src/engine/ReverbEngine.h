@@ -155,8 +155,14 @@ private:
     void makeMono(const float* inLeft, const float* inRight, int frames, int stride);
     void filterMono(int frames);
     void filterStereo(float* frames, int count);
+    // Mixes one frame with the given wet and dry gains (the convolution kernel uses the levels, the others
+    // the gains) and runs the wet meter into wetPeak_ when it is the meter's source.
     void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
-                   int stride, int accumulate, double wetLeft, double wetRight);
+                   int stride, int accumulate, double wetLeft, double wetRight, double wet, double dry);
+    void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
+                   int stride, int accumulate, double wetLeft, double wetRight) {
+        mixOutput(outLeft, outRight, inLeft, inRight, frame, stride, accumulate, wetLeft, wetRight, wetGain, dryGain);
+    }
     void meterOutput(const float* outLeft, const float* outRight, int frames, int stride);
     void flushKernelStates();
     int trimmedLength(const float* outLeft, const float* outRight, int frames, int stride) const;

@@ -34,10 +34,11 @@ inline float ReverbEngine::smooth(float v) {
 // Writes (or adds) one output frame: wet x wetGain + dry input x dryGain, rounded to float; runs the wet
 // meter when it is the meter's source.
 inline void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
-                                    int frame, int stride, int accumulate, double wetLeft, double wetRight) {
+                                    int frame, int stride, int accumulate, double wetLeft, double wetRight,
+                                    double wet, double dry) {
     const int at = frame * stride;
-    const float l = toOutputFloat(wetLeft * wetGain + finiteOrZero(inLeft[at]) * dryGain);
-    const float r = toOutputFloat(wetRight * wetGain + finiteOrZero(inRight[at]) * dryGain);
+    const float l = toOutputFloat(wetLeft * wet + finiteOrZero(inLeft[at]) * dry);
+    const float r = toOutputFloat(wetRight * wet + finiteOrZero(inRight[at]) * dry);
     if (accumulate) {
         outLeft[at] += l;
         outRight[at] += r;
@@ -46,7 +47,7 @@ inline void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float
         outRight[at] = r;
     }
     if (meterSource == 2) {
-        const float v = toOutputFloat(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetGain);
+        const float v = toOutputFloat(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wet);
         wetPeak_ = std::max(wetPeak_, smooth(v));
     }
 }

@@ -12,8 +12,6 @@ namespace ulvetta {
 
 namespace {
 
-inline double finiteOr0(float v) { return std::isfinite(v) ? v : 0.0; }
-
 // One sample through a filter section with its left state (the kernel runs both channels through it).
 inline double sectionStep(BiquadSection& s, double x) {
     const double y = s.b0 * x + s.b1 * s.x1L + s.b2 * s.x2L - s.a1 * s.y1L - s.a2 * s.y2L;
@@ -40,13 +38,13 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
     }
     if (frames <= 0) return 0;
     const bool ready = partitions != nullptr && irLeft != nullptr && historyLeft.count > 0;
-    float wetPeak = 0.0f;
+    wetPeak_ = 0.0f;
     for (int i = 0; i < frames; ++i) {
         const int at = i * stride;
         double wetLeft = 0.0, wetRight = 0.0;
         if (ready) {
             // 1-3. Gain, the input sections and the colour low-pass, one state run over left then right.
-            double xl = finiteOr0(inLeft[at]) * inputGain, xr = finiteOr0(inRight[at]) * inputGain;
+            double xl = finiteOrZero(inLeft[at]) * inputGain, xr = finiteOrZero(inRight[at]) * inputGain;
             for (int s = 0; s < 3; ++s) xl = sectionStep(filterSections[s], xl);
             for (int s = 0; s < 3; ++s) xr = sectionStep(filterSections[s], xr);
             double cl = xl, cr = xr;
@@ -106,21 +104,11 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
             wetLeft = headLeft + partSumLeft[slot];
             wetRight = headRight + partSumRight[slot];
         }
-        // 9-10. Wet meter and mix.
-        if (meterSource == 2)
-            wetPeak = std::max(wetPeak, smooth(toOutputFloat(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wetLevel)));
-        const float l = toOutputFloat(wetLeft * wetLevel + finiteOr0(inLeft[at]) * dryLevel);
-        const float r = toOutputFloat(wetRight * wetLevel + finiteOr0(inRight[at]) * dryLevel);
-        if (accumulate) {
-            outLeft[at] += l;
-            outRight[at] += r;
-        } else {
-            outLeft[at] = l;
-            outRight[at] = r;
-        }
+        // 9-10. Mix with the levels, and the wet meter.
+        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight, wetLevel, dryLevel);
     }
     if (meterSource == 2) {
-        raiseLevel(wetPeak);
+        raiseLevel(wetPeak_);
         cleanSmoothState();
     }
     // Keep denormals out of the recursive states.

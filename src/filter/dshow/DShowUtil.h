@@ -45,6 +45,36 @@ private:
     CRITICAL_SECTION& cs_;
 };
 
+// A COM object with one interface I besides IUnknown and its own reference count; counted among the
+// module's live objects. Starts with no reference; deleted by the last Release.
+template <class I>
+class SingleInterfaceObject : public I {
+public:
+    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
+        if (ppv == nullptr) return E_POINTER;
+        if (riid == IID_IUnknown || riid == __uuidof(I)) {
+            *ppv = static_cast<I*>(this);
+            AddRef();
+            return S_OK;
+        }
+        *ppv = nullptr;
+        return E_NOINTERFACE;
+    }
+    STDMETHODIMP_(ULONG) AddRef() override { return ++refs_; }
+    STDMETHODIMP_(ULONG) Release() override {
+        const ULONG r = --refs_;
+        if (r == 0) delete this;
+        return r;
+    }
+
+protected:
+    SingleInterfaceObject() { ++g_objectCount; }
+    virtual ~SingleInterfaceObject() { --g_objectCount; }
+
+private:
+    std::atomic<ULONG> refs_{0};
+};
+
 // Holds one reference to a COM object.
 template <class T>
 class ComRef {

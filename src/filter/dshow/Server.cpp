@@ -38,26 +38,9 @@ const ClassEntry kClasses[] = {
     {L"Morvane Ulvetta Property Page", &CLSID_UlvettaPropertyPage, &CreatePropertyPage},
 };
 
-class ClassFactory : public IClassFactory {
+class ClassFactory : public SingleInterfaceObject<IClassFactory> {
 public:
-    explicit ClassFactory(const ClassEntry& e) : entry_(e) { ++g_objectCount; }
-    virtual ~ClassFactory() { --g_objectCount; }
-    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-        if (ppv == nullptr) return E_POINTER;
-        if (riid == IID_IUnknown || riid == IID_IClassFactory) {
-            *ppv = static_cast<IClassFactory*>(this);
-            AddRef();
-            return S_OK;
-        }
-        *ppv = nullptr;
-        return E_NOINTERFACE;
-    }
-    STDMETHODIMP_(ULONG) AddRef() override { return ++refs_; }
-    STDMETHODIMP_(ULONG) Release() override {
-        const ULONG r = --refs_;
-        if (r == 0) delete this;
-        return r;
-    }
+    explicit ClassFactory(const ClassEntry& e) : entry_(e) {}
     STDMETHODIMP CreateInstance(IUnknown* outer, REFIID riid, void** ppv) override {
         if (ppv == nullptr) return E_POINTER;
         *ppv = nullptr;
@@ -81,7 +64,6 @@ public:
 
 private:
     const ClassEntry& entry_;
-    std::atomic<ULONG> refs_{0};
 };
 
 void GuidText(const CLSID& clsid, wchar_t* out, int capacity) { StringFromGUID2(clsid, out, capacity); }

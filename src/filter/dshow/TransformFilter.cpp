@@ -11,32 +11,10 @@ namespace {
 
 
 // Enumerates the filter's two pins; holds a reference on the filter.
-class PinEnumerator : public IEnumPins {
+class PinEnumerator : public SingleInterfaceObject<IEnumPins> {
 public:
-    PinEnumerator(TransformFilter* f, ULONG position) : filter_(f), pos_(position) {
-        filter_->AddRef();
-        ++g_objectCount;
-    }
-    virtual ~PinEnumerator() {
-        filter_->Release();
-        --g_objectCount;
-    }
-    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-        if (ppv == nullptr) return E_POINTER;
-        if (riid == IID_IUnknown || riid == IID_IEnumPins) {
-            *ppv = static_cast<IEnumPins*>(this);
-            AddRef();
-            return S_OK;
-        }
-        *ppv = nullptr;
-        return E_NOINTERFACE;
-    }
-    STDMETHODIMP_(ULONG) AddRef() override { return ++refs_; }
-    STDMETHODIMP_(ULONG) Release() override {
-        const ULONG r = --refs_;
-        if (r == 0) delete this;
-        return r;
-    }
+    PinEnumerator(TransformFilter* f, ULONG position) : filter_(f), pos_(position) { filter_->AddRef(); }
+    ~PinEnumerator() override { filter_->Release(); }
     STDMETHODIMP Next(ULONG count, IPin** pins, ULONG* fetched) override {
         if (pins == nullptr) return E_POINTER;
         if (count > 1 && fetched == nullptr) return E_INVALIDARG;
@@ -74,36 +52,13 @@ public:
 private:
     TransformFilter* filter_;
     ULONG pos_;
-    std::atomic<ULONG> refs_{0};
 };
 
 // Enumerates the media types a pin offers; holds a reference on the pin (and so on the filter).
-class MediaTypeEnumerator : public IEnumMediaTypes {
+class MediaTypeEnumerator : public SingleInterfaceObject<IEnumMediaTypes> {
 public:
-    MediaTypeEnumerator(TransformPin* pin, ULONG position) : pin_(pin), pos_(position) {
-        pin_->AddRef();
-        ++g_objectCount;
-    }
-    virtual ~MediaTypeEnumerator() {
-        pin_->Release();
-        --g_objectCount;
-    }
-    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-        if (ppv == nullptr) return E_POINTER;
-        if (riid == IID_IUnknown || riid == IID_IEnumMediaTypes) {
-            *ppv = static_cast<IEnumMediaTypes*>(this);
-            AddRef();
-            return S_OK;
-        }
-        *ppv = nullptr;
-        return E_NOINTERFACE;
-    }
-    STDMETHODIMP_(ULONG) AddRef() override { return ++refs_; }
-    STDMETHODIMP_(ULONG) Release() override {
-        const ULONG r = --refs_;
-        if (r == 0) delete this;
-        return r;
-    }
+    MediaTypeEnumerator(TransformPin* pin, ULONG position) : pin_(pin), pos_(position) { pin_->AddRef(); }
+    ~MediaTypeEnumerator() override { pin_->Release(); }
     STDMETHODIMP Next(ULONG count, AM_MEDIA_TYPE** types, ULONG* fetched) override {
         if (types == nullptr) return E_POINTER;
         if (count > 1 && fetched == nullptr) return E_INVALIDARG;
@@ -142,7 +97,6 @@ public:
 private:
     TransformPin* pin_;
     ULONG pos_;
-    std::atomic<ULONG> refs_{0};
 };
 
 bool PartialMatch(const AM_MEDIA_TYPE* want, const AM_MEDIA_TYPE* have) {
