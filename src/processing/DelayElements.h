@@ -2,15 +2,22 @@
 // as an allpass of either sign form, as a write-only or comb line read through output taps; the pre-delay
 // step and output taps. All inline, no allocation, double precision; no stored value is ever denormal.
 //
-// The elements work on a LineView, a plain copy of a DelayLine's storage pointer, position, gain and
-// modulator taken at the start of a block (ViewOf) and whose position is stored back at its end
-// (StoreIndex): inside the per-sample loop nothing is reached through the owning records.
+// The elements work on one of two plain views of a DelayLine, taken at the start of a block and stored
+// back at its end, so that inside the per-sample loop nothing is reached through the owning records:
+//   LineView  - the line's storage, position, gain and modulator; each element steps the position, with
+//               its wrap-around (the early lines, and single lines in the tests);
+//   RunFrame  - one frame of a run (LineRuns): a stretch of frames in which no network line's write
+//               position and no output tap wraps, so that frame j of the run writes line k at its starting
+//               position - j and no element steps or tests for a wrap.
+// Both give an element the same three things: the cell at the write position, that position (for the
+// modulated read) and a step, so that each element below is written once for both.
 //
 // Index convention of a network line: the write index moves downwards (decremented after each write,
 // wrapping from -1 to length - 1). Before a write, samples[writeIndex] is the oldest entry (delay = length);
 // samples[writeIndex + k] (mod length) was written k samples ago.
 #pragma once
 
+#include <algorithm>
 #include <cfloat>
 #include <cmath>
 #include <cstdint>
@@ -33,6 +40,12 @@ struct LineView {
     int32_t writeIndex;
     double gain;
     Modulator* mod;    // null when the line is not modulated
+
+    double& cell() const { return samples[writeIndex]; }
+    int32_t position() const { return writeIndex; }
+    void step() {
+        if (--writeIndex < 0) writeIndex = length - 1;
+    }
 };
 
 inline LineView ViewOf(DelayLine& l) { return {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get()}; }
@@ -48,10 +61,6 @@ struct PreDelayView {
 inline PreDelayView ViewOf(PreDelayLine& l) { return {l.samples.get(), l.length, l.writeIndex}; }
 inline void StoreIndex(PreDelayLine& l, const PreDelayView& v) { l.writeIndex = v.writeIndex; }
 
-ULVETTA_ALWAYS_INLINE void StepDown(LineView& l) {
-    if (--l.writeIndex < 0) l.writeIndex = l.length - 1;
-}
-
 // Every value stored into a recirculating line passes here: a denormal (or zero) becomes an exact 0.0, so
 // that a decaying tail never leaves denormal numbers in the network, where every operation on them would
 // be many times slower. Only values below 2.2e-308 change, some 300 orders of magnitude below the
@@ -66,70 +75,119 @@ ULVETTA_ALWAYS_INLINE double RoundToEven(double v) {
     return (v + kShift) - kShift;
 }
 
+// One frame of a run of a network line (see LineRuns): the line's storage, length, gain and modulator,
+// its write position in this frame and the cell there. Built by At for each element call; the compiler
+// keeps none of it beyond the arithmetic.
+struct RunFrame {
+    double* samples;
+    int32_t length;
+    int32_t pos;
+    double gain;
+    Modulator* mod;
+    double* at;  // samples + pos
+
+    double& cell() const { return *at; }
+    int32_t position() const { return pos; }
+    void step() const {}  // the run's frame counter moves instead
+};
+
+// A network line over one run: its write position at the run's first frame and the cell there.
+struct RunLine {
+    double* samples;
+    int32_t length;
+    int32_t writeIndex;
+    double gain;
+    Modulator* mod;
+    double* at;  // samples + writeIndex, set when a run begins
+};
+
+ULVETTA_ALWAYS_INLINE RunFrame At(const RunLine& l, int32_t j) {
+    return {l.samples, l.length, l.writeIndex - j, l.gain, l.mod, l.at - j};
+}
+
 // Reads a modulated line at a delay of length - m samples, m being the modulator's current excursion,
 // interpolating linearly between the two stored neighbours that enclose that delay. m is split into its
 // nearest integer n and a remainder f in [-0.5, 0.5]; a positive f leans towards the newer neighbour
 // (one sample less delay), a negative f towards the older one (one sample more delay), so both weights
-// stay within 0..1 and the read never amplifies. The neighbour is chosen without a branch.
-ULVETTA_ALWAYS_INLINE double ModulatedRead(LineView& l) {
+// stay within 0..1 and the read never amplifies.
+template <class Line>
+ULVETTA_ALWAYS_INLINE double ModulatedRead(const Line& l) {
     // The excursion is never negative (a half sine from 0 to depth): with i its whole part and g its
     // fraction, the read point lies between the entries i and i + 1 samples newer than the oldest, so
     // this is the interpolation above without the rounding and the choice of side.
     const double m = l.mod->Tick();
     const int32_t i = static_cast<int32_t>(m);
     const double g = m - i;
-    int32_t p = l.writeIndex - i;
+    int32_t p = l.position() - i;
     if (p < 0) p += l.length;
     const int32_t q = (p == 0 ? l.length : p) - 1;
     return (1.0 - g) * l.samples[p] + g * l.samples[q];
 }
 
 // The line's output before this sample's write: the oldest entry, or the modulated read.
-ULVETTA_ALWAYS_INLINE double ReadLine(LineView& l) { return l.mod ? ModulatedRead(l) : l.samples[l.writeIndex]; }
+template <class Line>
+ULVETTA_ALWAYS_INLINE double ReadLine(const Line& l) {
+    return l.mod ? ModulatedRead(l) : l.cell();
+}
 
 // Plain delay of length samples (less the modulation excursion when modulated).
-ULVETTA_ALWAYS_INLINE double Delay(LineView& l, double x) {
+template <class Line>
+ULVETTA_ALWAYS_INLINE double Delay(Line&& l, double x) {
     const double z = ReadLine(l);
-    l.samples[l.writeIndex] = NoDenormal(x);
-    StepDown(l);
+    l.cell() = NoDenormal(x);
+    l.step();
     return z;
 }
 
 // Allpass, first sign form: v = x - g z stored, y = g v + z.
-ULVETTA_ALWAYS_INLINE double AllpassA(LineView& l, double x) {
+template <class Line>
+ULVETTA_ALWAYS_INLINE double AllpassA(Line&& l, double x) {
     const double z = ReadLine(l);
     const double v = x - l.gain * z;
-    l.samples[l.writeIndex] = NoDenormal(v);  // the output uses v as computed: the flush stays off its path
-    StepDown(l);
+    l.cell() = NoDenormal(v);  // the output uses v as computed: the flush stays off its path
+    l.step();
     return l.gain * v + z;
 }
 
 // Allpass, second sign form: v = x + g z stored, y = z - g v.
-ULVETTA_ALWAYS_INLINE double AllpassB(LineView& l, double x) {
+template <class Line>
+ULVETTA_ALWAYS_INLINE double AllpassB(Line&& l, double x) {
     const double z = ReadLine(l);
     const double v = x + l.gain * z;
-    l.samples[l.writeIndex] = NoDenormal(v);
-    StepDown(l);
+    l.cell() = NoDenormal(v);
+    l.step();
     return z - l.gain * v;
 }
 
 // Stores x without producing a value (the line is read through taps or Oldest). A modulator only advances,
 // so that its phase keeps running in step with the modulated lines.
-ULVETTA_ALWAYS_INLINE void WriteOnly(LineView& l, double x) {
-    l.samples[l.writeIndex] = NoDenormal(x);
-    StepDown(l);
+template <class Line>
+ULVETTA_ALWAYS_INLINE void WriteOnly(Line&& l, double x) {
+    l.cell() = NoDenormal(x);
+    l.step();
     if (l.mod) l.mod->Advance();
 }
 
 // Recirculating comb read through taps: stores x + g times the line's output.
-ULVETTA_ALWAYS_INLINE void CombWrite(LineView& l, double x) {
+template <class Line>
+ULVETTA_ALWAYS_INLINE void CombWrite(Line&& l, double x) {
     const double z = ReadLine(l);
-    l.samples[l.writeIndex] = NoDenormal(x + l.gain * z);
-    StepDown(l);
+    l.cell() = NoDenormal(x + l.gain * z);
+    l.step();
 }
 
 // The sample about to be overwritten (delay = length), without stepping or modulation.
-ULVETTA_ALWAYS_INLINE double Oldest(const LineView& l) { return l.samples[l.writeIndex]; }
+template <class Line>
+ULVETTA_ALWAYS_INLINE double Oldest(const Line& l) {
+    return l.cell();
+}
+
+// In a run, the sample the next frame will overwrite: what Oldest returns for a line that this frame has
+// already written and stepped. This one position may lie past the run's end, so it wraps.
+ULVETTA_ALWAYS_INLINE double OldestAfterWrite(const RunLine& l, int32_t j) {
+    const int32_t p = l.writeIndex - j - 1;
+    return l.samples[p < 0 ? p + l.length : p];
+}
 
 // Pre-delay: returns the sample stored length samples ago and stores x; this line moves upwards.
 ULVETTA_ALWAYS_INLINE double PreDelayStep(PreDelayView& l, double x) {
@@ -139,25 +197,72 @@ ULVETTA_ALWAYS_INLINE double PreDelayStep(PreDelayView& l, double x) {
     return out;
 }
 
-// Moves a tap along with its line's write index; done once per sample after the lines are written.
-ULVETTA_ALWAYS_INLINE void StepTap(OutputTap& t) {
-    if (--t.index < 0) t.index = t.length - 1;
-}
-
-ULVETTA_ALWAYS_INLINE double ReadTap(const LineView& l, const OutputTap& t) { return l.samples[t.index]; }
-
-// A kernel's output taps for the length of a block, positions and lengths in separate arrays so that the
-// per-sample step of all taps compiles to a few vector operations.
-struct TapViews {
+// A kernel's network lines and output taps for the length of one block, advanced in runs. Every line's
+// write position and every tap index moves down by one each frame; a run lasts until the first of them is
+// due to wrap (or the block ends), so inside a run frame j reads and writes at fixed offsets from where the
+// run began, and the wrap is done once per run for all of them.
+//
+// An output tap is stepped before it is read, after the lines of its frame have been written: in frame j
+// of a run it reads samples[index - 1 - j] of its line, index being its value at the run's start with 0
+// taken as length.
+struct LineRuns {
+    static constexpr int kMaxLines = 24;
     static constexpr int kMaxTaps = 20;
-    int32_t index[kMaxTaps];
-    int32_t length[kMaxTaps];
+    RunLine lines[kMaxLines];
+    int32_t tapIndex[kMaxTaps];
+    int32_t tapLength[kMaxTaps];
+    const double* tapSamples[kMaxTaps];
+    const double* tapAt[kMaxTaps];  // samples + index - 1 at the run's start
+    int lineCount = 0, tapCount = 0;
+
+    // Takes lines 0..count-1, and taps 0..taps-1 reading the lines tapLine names (all among those lines).
+    void Load(DelayLine* source, int count, const OutputTap* taps, const int* tapLine, int tapsUsed) {
+        lineCount = count;
+        tapCount = tapsUsed;
+        for (int i = 0; i < lineCount; ++i) {
+            DelayLine& l = source[i];
+            lines[i] = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr};
+        }
+        for (int i = 0; i < tapCount; ++i) {
+            tapIndex[i] = taps[i].index;
+            tapLength[i] = taps[i].length;
+            tapSamples[i] = lines[tapLine[i]].samples;
+        }
+    }
+
+    void Store(DelayLine* target, OutputTap* taps) const {
+        for (int i = 0; i < lineCount; ++i) target[i].writeIndex = lines[i].writeIndex;
+        for (int i = 0; i < tapCount; ++i) taps[i].index = tapIndex[i] == tapLength[i] ? 0 : tapIndex[i];
+    }
+
+    // Starts a run of at most limit (>= 1) frames; returns its length, at least 1.
+    int Begin(int limit) {
+        int n = limit;
+        for (int i = 0; i < lineCount; ++i) {
+            RunLine& l = lines[i];
+            n = std::min(n, l.writeIndex + 1);
+            l.at = l.samples + l.writeIndex;
+        }
+        for (int i = 0; i < tapCount; ++i) {
+            if (tapIndex[i] == 0) tapIndex[i] = tapLength[i];
+            n = std::min(n, tapIndex[i]);
+            tapAt[i] = tapSamples[i] + tapIndex[i] - 1;
+        }
+        return n;
+    }
+
+    // Ends a run of n frames: every position moves down by n, wrapping where the run ended at 0.
+    void End(int n) {
+        for (int i = 0; i < lineCount; ++i) {
+            RunLine& l = lines[i];
+            l.writeIndex -= n;
+            if (l.writeIndex < 0) l.writeIndex += l.length;
+        }
+        for (int i = 0; i < tapCount; ++i) tapIndex[i] -= n;
+    }
+
+    // Output tap i in frame j of the run.
+    double Tap(int i, int32_t j) const { return tapAt[i][-j]; }
 };
-
-ULVETTA_ALWAYS_INLINE void StepTaps(TapViews& t, int count) {
-    for (int i = 0; i < count; ++i) t.index[i] = (t.index[i] == 0 ? t.length[i] : t.index[i]) - 1;
-}
-
-ULVETTA_ALWAYS_INLINE double ReadTap(const LineView& l, const TapViews& t, int i) { return l.samples[t.index[i]]; }
 
 }  // namespace ulvetta

@@ -37,8 +37,7 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
 
     NetworkViews v;
     v.Load(*this, 12, 14, false);
-    LineView* lines = v.lines;
-    TapViews& taps = v.taps;
+    const RunLine* lines = v.runs.lines;
     double* echo = preDelayLine.samples.get();
     const int32_t echoLength = preDelayLine.length;
     int32_t k = preDelayLine.writeIndex;
@@ -46,27 +45,30 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
     const double cutoff = colourCutoff;
     double colourL = colourState, colourR = colourState2, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     wetPeak_ = 0.0f;
-    for (int i = 0; i < frames; ++i) {
-        int32_t k1 = k + 1;
-        if (k1 >= echoLength) k1 -= echoLength;
-        const double cL = ColourStep(colourL, echo[k], cutoff);
-        const double cR = ColourStep(colourR, echo[k1], cutoff);
+    for (int i = 0; i < frames;) {
+        const int run = v.runs.Begin(frames - i);
+        for (int j = 0; j < run; ++j, ++i) {
+            int32_t k1 = k + 1;
+            if (k1 >= echoLength) k1 -= echoLength;
+            const double cL = ColourStep(colourL, echo[k], cutoff);
+            const double cR = ColourStep(colourR, echo[k1], cutoff);
 
-        const double q = Diffuse(lines, (cL + cR) * dc);
-        const double u = decayK * Oldest(lines[11]) + q;
-        WriteOnly(lines[7], TankHalf(lines, 4, u, false, dc, decayK, dampK, dampLeft));
-        const double u2 = decayK * Oldest(lines[7]) + q;
-        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
-        StepTaps(taps, 14);
-        const double tankLeft = PlateTapsLeft(lines, taps);
-        const double tankRight = PlateTapsRight(lines, taps);
+            const double q = Diffuse(lines, j, (cL + cR) * dc);
+            const double u = decayK * Oldest(At(lines[11], j)) + q;
+            WriteOnly(At(lines[7], j), TankHalf(lines, j, 4, u, false, dc, decayK, dampK, dampLeft));
+            const double u2 = decayK * OldestAfterWrite(lines[7], j) + q;
+            WriteOnly(At(lines[11], j), TankHalf(lines, j, 8, u2, false, dc, decayK, dampK, dampRight));
+            const double tankLeft = PlateTapsLeft(v.runs, j);
+            const double tankRight = PlateTapsRight(v.runs, j);
 
-        echo[k] = NoDenormal(scratch[2 * i] + feedback * (cL + kCrossFeed * cR));
-        k = k1;
-        echo[k] = NoDenormal(scratch[2 * i + 1] + feedback * (cR + kCrossFeed * cL));
-        if (++k == echoLength) k = 0;
+            echo[k] = NoDenormal(scratch[2 * i] + feedback * (cL + kCrossFeed * cR));
+            k = k1;
+            echo[k] = NoDenormal(scratch[2 * i + 1] + feedback * (cR + kCrossFeed * cL));
+            if (++k == echoLength) k = 0;
 
-        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, tankLeft + cL, tankRight + cR);
+            mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, tankLeft + cL, tankRight + cR);
+        }
+        v.runs.End(run);
     }
     v.Store(*this);
     preDelayLine.writeIndex = k;

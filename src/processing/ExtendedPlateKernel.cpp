@@ -22,9 +22,9 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
 
     NetworkViews v;
     v.Load(*this, 20, 20, true);
-    LineView* lines = v.lines;
+    const RunLine* lines = v.runs.lines;
+    const LineRuns& r = v.runs;
     LineView* early = v.early;
-    TapViews& taps = v.taps;
     PreDelayView pre = ViewOf(preDelayLine);
     const bool usePreDelay = preDelayOn && pre.length > 0;
     const bool crossfade = (diffusion != 100);
@@ -34,46 +34,44 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
     double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
     wetPeak_ = 0.0f;
-    for (int i = 0; i < frames; ++i) {
-        const double c = ColourStep(colour, mono[i], cutoff);
-        const double eL = EarlyLeft(early, c) * eGain;
-        const double eR = EarlyRight(early, c) * eGain;
-        const double p = usePreDelay ? PreDelayStep(pre, c) : c;
-        double d = Diffuse(lines, p);
-        if (crossfade) d = dc * d + (1.0 - dc) * p;
+    for (int i = 0; i < frames;) {
+        const int run = v.runs.Begin(frames - i);
+        for (int j = 0; j < run; ++j, ++i) {
+            const double c = ColourStep(colour, mono[i], cutoff);
+            const double eL = EarlyLeft(early, c) * eGain;
+            const double eR = EarlyRight(early, c) * eGain;
+            const double p = usePreDelay ? PreDelayStep(pre, c) : c;
+            double d = Diffuse(lines, j, p);
+            if (crossfade) d = dc * d + (1.0 - dc) * p;
 
-        const double u = decayK * Oldest(lines[11]) + d;
-        CombWrite(lines[17], u);
-        const double t = TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampLeft);
-        CombWrite(lines[12], t);
-        WriteOnly(lines[13], t);
-        WriteOnly(lines[7], t);
+            const double u = decayK * Oldest(At(lines[11], j)) + d;
+            CombWrite(At(lines[17], j), u);
+            const double t = TankHalf(lines, j, 4, u, crossfade, dc, decayK, dampK, dampLeft);
+            CombWrite(At(lines[12], j), t);
+            WriteOnly(At(lines[13], j), t);
+            WriteOnly(At(lines[7], j), t);
 
-        const double u2 = decayK * Oldest(lines[7]) + d;
-        WriteOnly(lines[19], u2);
-        const double t2 = TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight);
-        CombWrite(lines[14], t2);
-        WriteOnly(lines[15], t2);
-        WriteOnly(lines[11], t2);
+            const double u2 = decayK * OldestAfterWrite(lines[7], j) + d;
+            WriteOnly(At(lines[19], j), u2);
+            const double t2 = TankHalf(lines, j, 8, u2, false, dc, decayK, dampK, dampRight);
+            CombWrite(At(lines[14], j), t2);
+            WriteOnly(At(lines[15], j), t2);
+            WriteOnly(At(lines[11], j), t2);
 
-        StepTaps(taps, 20);
-        double wetLeft, wetRight;
-        if (!weighted) {
-            wetLeft = PlateTapsLeft(lines, taps) + ReadTap(lines[12], taps, 14) - ReadTap(lines[14], taps, 15) +
-                      ReadTap(lines[19], taps, 18) + eL;
-            wetRight = PlateTapsRight(lines, taps) + ReadTap(lines[13], taps, 16) -
-                       ReadTap(lines[15], taps, 17) + ReadTap(lines[17], taps, 19) + eR;
-        } else {
-            wetLeft = -0.3 * ReadTap(lines[10], taps, 2) + 2.0 * ReadTap(lines[11], taps, 3) -
-                      0.3 * ReadTap(lines[6], taps, 5) - 2.0 * ReadTap(lines[7], taps, 6) +
-                      2.0 * ReadTap(lines[12], taps, 14) - 2.0 * ReadTap(lines[14], taps, 15) +
-                      0.3 * ReadTap(lines[19], taps, 18) + eL;
-            wetRight = -0.3 * ReadTap(lines[6], taps, 9) + 2.0 * ReadTap(lines[7], taps, 10) -
-                       0.3 * ReadTap(lines[10], taps, 12) - 2.0 * ReadTap(lines[11], taps, 13) +
-                       2.0 * ReadTap(lines[13], taps, 16) - 2.0 * ReadTap(lines[15], taps, 17) +
-                       0.3 * ReadTap(lines[17], taps, 19) + eR;
+            // Taps 14..19 read lines 12, 14, 13, 15, 19 and 17.
+            double wetLeft, wetRight;
+            if (!weighted) {
+                wetLeft = PlateTapsLeft(r, j) + r.Tap(14, j) - r.Tap(15, j) + r.Tap(18, j) + eL;
+                wetRight = PlateTapsRight(r, j) + r.Tap(16, j) - r.Tap(17, j) + r.Tap(19, j) + eR;
+            } else {
+                wetLeft = -0.3 * r.Tap(2, j) + 2.0 * r.Tap(3, j) - 0.3 * r.Tap(5, j) - 2.0 * r.Tap(6, j) +
+                          2.0 * r.Tap(14, j) - 2.0 * r.Tap(15, j) + 0.3 * r.Tap(18, j) + eL;
+                wetRight = -0.3 * r.Tap(9, j) + 2.0 * r.Tap(10, j) - 0.3 * r.Tap(12, j) - 2.0 * r.Tap(13, j) +
+                           2.0 * r.Tap(16, j) - 2.0 * r.Tap(17, j) + 0.3 * r.Tap(19, j) + eR;
+            }
+            mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
         }
-        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
+        v.runs.End(run);
     }
     v.Store(*this);
     StoreIndex(preDelayLine, pre);

@@ -34,9 +34,8 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
 
     NetworkViews v;
     v.Load(*this, 12, 14, true);
-    LineView* lines = v.lines;
+    const RunLine* lines = v.runs.lines;
     LineView* early = v.early;
-    TapViews& taps = v.taps;
     PreDelayView pre = ViewOf(preDelayLine);
     const bool usePreDelay = preDelayOn && pre.length > 0;
     const bool crossfade = (diffusion != 100);
@@ -45,24 +44,27 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
     double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
     wetPeak_ = 0.0f;
-    for (int i = 0; i < frames; ++i) {
-        const double c = ColourStep(colour, mono[i], cutoff);
-        const double eL = EarlyLeft(early, c) * eGain;
-        const double eR = EarlyRight(early, c) * eGain;
-        const double p = usePreDelay ? PreDelayStep(pre, c) : c;
-        double d = Diffuse(lines, p);
-        if (crossfade) d = dc * d + (1.0 - dc) * p;
+    for (int i = 0; i < frames;) {
+        const int run = v.runs.Begin(frames - i);
+        for (int j = 0; j < run; ++j, ++i) {
+            const double c = ColourStep(colour, mono[i], cutoff);
+            const double eL = EarlyLeft(early, c) * eGain;
+            const double eR = EarlyRight(early, c) * eGain;
+            const double p = usePreDelay ? PreDelayStep(pre, c) : c;
+            double d = Diffuse(lines, j, p);
+            if (crossfade) d = dc * d + (1.0 - dc) * p;
 
-        // Left half, fed back from the right half's end line; then the right half, fed from the left's.
-        const double u = decayK * Oldest(lines[11]) + d;
-        WriteOnly(lines[7], TankHalf(lines, 4, u, crossfade, dc, decayK, dampK, dampLeft));
-        const double u2 = decayK * Oldest(lines[7]) + d;
-        WriteOnly(lines[11], TankHalf(lines, 8, u2, false, dc, decayK, dampK, dampRight));
+            // Left half, fed back from the right half's end line; then the right half, fed from the left's.
+            const double u = decayK * Oldest(At(lines[11], j)) + d;
+            WriteOnly(At(lines[7], j), TankHalf(lines, j, 4, u, crossfade, dc, decayK, dampK, dampLeft));
+            const double u2 = decayK * OldestAfterWrite(lines[7], j) + d;
+            WriteOnly(At(lines[11], j), TankHalf(lines, j, 8, u2, false, dc, decayK, dampK, dampRight));
 
-        StepTaps(taps, 14);
-        const double wetLeft = PlateTapsLeft(lines, taps) + eL;
-        const double wetRight = PlateTapsRight(lines, taps) + eR;
-        mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
+            const double wetLeft = PlateTapsLeft(v.runs, j) + eL;
+            const double wetRight = PlateTapsRight(v.runs, j) + eR;
+            mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight);
+        }
+        v.runs.End(run);
     }
     v.Store(*this);
     StoreIndex(preDelayLine, pre);

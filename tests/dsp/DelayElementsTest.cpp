@@ -89,18 +89,34 @@ TEST(DelayElements, PreDelayReturnsItsInputLengthSamplesLater) {
 }
 
 // A tap at position P in a line of length N reads the sample written (P - 1) mod N samples before the
-// latest, so a position past the end of a short line wraps around.
+// latest, so a position past the end of a short line wraps around. The line and its tap advance in runs
+// as in the kernels, over blocks of odd sizes that cut runs short, and the positions are stored back
+// between blocks. Oldest after the write reads the sample written N - 1 samples before the latest.
 TEST(DelayElements, TapsReadAFixedDelayAndWrapInShortLines) {
     const int n = 220;
     for (int position : {0, 1, 121, 219, 266, 1996, 3627}) {
         DelayLine line = MakeLine(n, 0.0);
-        LineView l = ViewOf(line);
-        OutputTap t{position % n, n};
+        OutputTap tap{position % n, n};
+        const int tapLine = 0;
         const int delay = ((position - 1) % n + n) % n;
-        for (int i = 0; i < 3 * n; ++i) {
-            WriteOnly(l, i + 1.0);
-            StepTap(t);
-            ASSERT_EQ(ReadTap(l, t), i >= delay ? i + 1.0 - delay : 0.0) << "position " << position << " at " << i;
+        int i = 0;
+        for (int block : {1, 7, 220, 219, 64, 333, 5}) {
+            LineRuns runs;
+            runs.Load(&line, 1, &tap, &tapLine, 1);
+            for (int done = 0; done < block;) {
+                const int run = runs.Begin(block - done);
+                ASSERT_GE(run, 1);
+                for (int j = 0; j < run; ++j, ++i, ++done) {
+                    WriteOnly(At(runs.lines[0], j), i + 1.0);
+                    ASSERT_EQ(runs.Tap(0, j), i >= delay ? i + 1.0 - delay : 0.0)
+                        << "position " << position << " at " << i;
+                    ASSERT_EQ(OldestAfterWrite(runs.lines[0], j), i >= n - 1 ? i + 2.0 - n : 0.0) << i;
+                }
+                runs.End(run);
+            }
+            runs.Store(&line, &tap);
+            ASSERT_GE(tap.index, 0);
+            ASSERT_LT(tap.index, n);
         }
     }
 }
