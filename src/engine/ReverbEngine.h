@@ -156,14 +156,16 @@ private:
     void filterMono(int frames);
     void filterStereo(float* frames, int count);
     // Mixes one frame with the given wet and dry gains (the convolution kernel uses the levels, the others
-    // the gains) and runs the wet meter into wetPeak_ when it is the meter's source.
+    // the gains) and runs the wet or the output meter into meterPeak_ when it is the meter's source.
     void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
                    int stride, int accumulate, double wetLeft, double wetRight, double wet, double dry);
     void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
                    int stride, int accumulate, double wetLeft, double wetRight) {
         mixOutput(outLeft, outRight, inLeft, inRight, frame, stride, accumulate, wetLeft, wetRight, wetGain, dryGain);
     }
-    void meterOutput(const float* outLeft, const float* outRight, int frames, int stride);
+    // Starts a block's wet or output meter; finishMeter raises the level to its peak after the block.
+    void startMeter() { meterPeak_ = 0.0f; }
+    void finishMeter();
     void flushKernelStates();
     int trimmedLength(const float* outLeft, const float* outRight, int frames, int stride) const;
 
@@ -188,8 +190,8 @@ private:
     int processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                            int stride, int accumulate, int flush);
 
-    // Running peak of the wet meter within the current block.
-    float wetPeak_ = 0.0f;
+    // Running peak of the wet or output meter within the current block.
+    float meterPeak_ = 0.0f;
 };
 
 }  // namespace ulvetta

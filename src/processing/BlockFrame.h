@@ -32,7 +32,7 @@ inline float ReverbEngine::smooth(float v) {
 }
 
 // Writes (or adds) one output frame: wet x wetGain + dry input x dryGain, rounded to float; runs the wet
-// meter when it is the meter's source.
+// or the output meter when it is the meter's source.
 inline void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                     int frame, int stride, int accumulate, double wetLeft, double wetRight,
                                     double wet, double dry) {
@@ -48,7 +48,10 @@ inline void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float
     }
     if (meterSource == 2) {
         const float v = toOutputFloat(std::max(std::fabs(wetLeft), std::fabs(wetRight)) * wet);
-        wetPeak_ = std::max(wetPeak_, smooth(v));
+        meterPeak_ = std::max(meterPeak_, smooth(v));
+    } else if (meterSource == 1) {
+        // The output as stored (a sum when accumulating; the later channel when both are one buffer).
+        meterPeak_ = std::max(meterPeak_, smooth(std::max(std::fabs(outLeft[at]), std::fabs(outRight[at]))));
     }
 }
 

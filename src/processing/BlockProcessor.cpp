@@ -131,11 +131,9 @@ void ReverbEngine::filterStereo(float* frames, int count) {
     }
 }
 
-void ReverbEngine::meterOutput(const float* outLeft, const float* outRight, int frames, int stride) {
-    float peak = 0.0f;
-    for (int i = 0; i < frames; ++i)
-        peak = std::max(peak, smooth(std::max(std::fabs(outLeft[i * stride]), std::fabs(outRight[i * stride]))));
-    raiseLevel(peak);
+void ReverbEngine::finishMeter() {
+    if (meterSource != 1 && meterSource != 2) return;
+    raiseLevel(meterPeak_);
     cleanSmoothState();
 }
 
@@ -177,13 +175,9 @@ int ReverbEngine::processDry(float* outLeft, float* outRight, const float* inLef
     if (frames <= 0) return 0;
     decayMeter(frames);
     if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    wetPeak_ = 0.0f;
+    startMeter();
     for (int i = 0; i < frames; ++i) mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, 0.0, 0.0);
-    if (meterSource == 2) {
-        raiseLevel(wetPeak_);
-        cleanSmoothState();
-    }
-    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
+    finishMeter();
     return trimmedLength(outLeft, outRight, frames, stride);
 }
 

@@ -38,7 +38,7 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
     }
     if (frames <= 0) return 0;
     const bool ready = partitions != nullptr && irLeft != nullptr && historyLeft.count > 0;
-    wetPeak_ = 0.0f;
+    startMeter();
     for (int i = 0; i < frames; ++i) {
         const int at = i * stride;
         double wetLeft = 0.0, wetRight = 0.0;
@@ -107,10 +107,7 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
         // 9-10. Mix with the levels, and the wet meter.
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight, wetLevel, dryLevel);
     }
-    if (meterSource == 2) {
-        raiseLevel(wetPeak_);
-        cleanSmoothState();
-    }
+    finishMeter();
     // Keep denormals out of the recursive states.
     colourState = flushTiny(colourState);
     for (int s = 0; s < 3; ++s) {
@@ -120,7 +117,6 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
         f.y1L = flushTiny(f.y1L);
         f.y2L = flushTiny(f.y2L);
     }
-    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     if (!flush) return frames;
     const int produced = std::min(frames, tailCountdown);
     tailCountdown -= produced;

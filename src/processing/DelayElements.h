@@ -46,6 +46,10 @@ struct LineView {
     void step() {
         if (--writeIndex < 0) writeIndex = length - 1;
     }
+    double excursion() const { return mod->Tick(); }
+    void advanceModulator() const {
+        if (mod) mod->Advance();
+    }
 };
 
 inline LineView ViewOf(DelayLine& l) { return {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get()}; }
@@ -75,34 +79,44 @@ ULVETTA_ALWAYS_INLINE double RoundToEven(double v) {
     return (v + kShift) - kShift;
 }
 
-// One frame of a run of a network line (see LineRuns): the line's storage, length, gain and modulator,
-// its write position in this frame and the cell there. Built by At for each element call; the compiler
-// keeps none of it beyond the arithmetic.
+// A network line over one run (see LineRuns): its write position at the run's first frame and the cell
+// there; for a modulated line, a copy of its modulator's rotation, stepped once per frame of the run.
+struct RunLine {
+    double* samples;
+    int32_t length;
+    int32_t writeIndex;
+    double gain;
+    Modulator* mod;  // null when the line is not modulated
+    double* at;      // samples + writeIndex, set when a run begins
+    Rotation rotation;
+    double depth;
+};
+
+// One frame of a run of a network line: its storage, length, gain and modulator, its write position in
+// this frame and the cell there. Built by At for each element call; the compiler keeps none of it beyond
+// the arithmetic.
 struct RunFrame {
     double* samples;
     int32_t length;
     int32_t pos;
     double gain;
     Modulator* mod;
-    double* at;  // samples + pos
+    double* at;    // samples + pos
+    RunLine* run;  // for the modulator's rotation
 
     double& cell() const { return *at; }
     int32_t position() const { return pos; }
     void step() const {}  // the run's frame counter moves instead
+    double excursion() const {
+        const double m = run->depth * run->rotation.sine;
+        run->rotation.Step();
+        return m;
+    }
+    void advanceModulator() const {}  // the run's end moves every modulator's phase
 };
 
-// A network line over one run: its write position at the run's first frame and the cell there.
-struct RunLine {
-    double* samples;
-    int32_t length;
-    int32_t writeIndex;
-    double gain;
-    Modulator* mod;
-    double* at;  // samples + writeIndex, set when a run begins
-};
-
-ULVETTA_ALWAYS_INLINE RunFrame At(const RunLine& l, int32_t j) {
-    return {l.samples, l.length, l.writeIndex - j, l.gain, l.mod, l.at - j};
+ULVETTA_ALWAYS_INLINE RunFrame At(RunLine& l, int32_t j) {
+    return {l.samples, l.length, l.writeIndex - j, l.gain, l.mod, l.at - j, &l};
 }
 
 // Reads a modulated line at a delay of length - m samples, m being the modulator's current excursion,
@@ -115,7 +129,7 @@ ULVETTA_ALWAYS_INLINE double ModulatedRead(const Line& l) {
     // The excursion is never negative (a half sine from 0 to depth): with i its whole part and g its
     // fraction, the read point lies between the entries i and i + 1 samples newer than the oldest, so
     // this is the interpolation above without the rounding and the choice of side.
-    const double m = l.mod->Tick();
+    const double m = l.excursion();
     const int32_t i = static_cast<int32_t>(m);
     const double g = m - i;
     int32_t p = l.position() - i;
@@ -165,7 +179,7 @@ template <class Line>
 ULVETTA_ALWAYS_INLINE void WriteOnly(Line&& l, double x) {
     l.cell() = NoDenormal(x);
     l.step();
-    if (l.mod) l.mod->Advance();
+    l.advanceModulator();
 }
 
 // Recirculating comb read through taps: stores x + g times the line's output.
@@ -205,6 +219,10 @@ ULVETTA_ALWAYS_INLINE double PreDelayStep(PreDelayView& l, double x) {
 // An output tap is stepped before it is read, after the lines of its frame have been written: in frame j
 // of a run it reads samples[index - 1 - j] of its line, index being its value at the run's start with 0
 // taken as length.
+//
+// A modulated line's rotation is stepped by its reads during the run (a write-only line's is not read) and
+// every modulator's phase moves past the run at its end. A run also ends where a modulator's sine is due to
+// be recomputed; then all of them are recomputed, which keeps their schedules together.
 struct LineRuns {
     static constexpr int kMaxLines = 24;
     static constexpr int kMaxTaps = 20;
@@ -213,15 +231,23 @@ struct LineRuns {
     int32_t tapLength[kMaxTaps];
     const double* tapSamples[kMaxTaps];
     const double* tapAt[kMaxTaps];  // samples + index - 1 at the run's start
-    int lineCount = 0, tapCount = 0;
+    int modulated[kMaxLines];       // the lines with a modulator
+    int lineCount = 0, tapCount = 0, modulatedCount = 0;
 
     // Takes lines 0..count-1, and taps 0..taps-1 reading the lines tapLine names (all among those lines).
     void Load(DelayLine* source, int count, const OutputTap* taps, const int* tapLine, int tapsUsed) {
         lineCount = count;
         tapCount = tapsUsed;
+        modulatedCount = 0;
         for (int i = 0; i < lineCount; ++i) {
             DelayLine& l = source[i];
-            lines[i] = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr};
+            RunLine& r = lines[i];
+            r = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr, Rotation(), 0.0};
+            if (r.mod) {
+                r.rotation = r.mod->rotation();
+                r.depth = r.mod->depth;
+                modulated[modulatedCount++] = i;
+            }
         }
         for (int i = 0; i < tapCount; ++i) {
             tapIndex[i] = taps[i].index;
@@ -232,6 +258,7 @@ struct LineRuns {
 
     void Store(DelayLine* target, OutputTap* taps) const {
         for (int i = 0; i < lineCount; ++i) target[i].writeIndex = lines[i].writeIndex;
+        for (int k = 0; k < modulatedCount; ++k) lines[modulated[k]].mod->rotation() = lines[modulated[k]].rotation;
         for (int i = 0; i < tapCount; ++i) taps[i].index = tapIndex[i] == tapLength[i] ? 0 : tapIndex[i];
     }
 
@@ -248,6 +275,7 @@ struct LineRuns {
             n = std::min(n, tapIndex[i]);
             tapAt[i] = tapSamples[i] + tapIndex[i] - 1;
         }
+        if (modulatedCount > 0) n = std::min(n, beginModulation());
         return n;
     }
 
@@ -259,10 +287,28 @@ struct LineRuns {
             if (l.writeIndex < 0) l.writeIndex += l.length;
         }
         for (int i = 0; i < tapCount; ++i) tapIndex[i] -= n;
+        for (int k = 0; k < modulatedCount; ++k) lines[modulated[k]].mod->Skip(n);
     }
 
     // Output tap i in frame j of the run.
     double Tap(int i, int32_t j) const { return tapAt[i][-j]; }
+
+private:
+    // Recomputes every modulator's sine when one of them is due; returns how long the run may last.
+    int32_t beginModulation() {
+        bool due = false;
+        for (int k = 0; k < modulatedCount; ++k) due |= lines[modulated[k]].mod->FramesBeforeResync() == 0;
+        int32_t n = INT32_MAX;
+        for (int k = 0; k < modulatedCount; ++k) {
+            RunLine& l = lines[modulated[k]];
+            if (due) {
+                l.mod->Resync();
+                l.rotation = l.mod->rotation();
+            }
+            n = std::min(n, l.mod->FramesBeforeResync());
+        }
+        return n;
+    }
 };
 
 }  // namespace ulvetta

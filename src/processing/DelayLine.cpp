@@ -40,16 +40,16 @@ void Modulator::Update() {
     period = std::max<int32_t>(period, 1);
     periodLength = period;
     phase = std::min(phase, period - 1);
-    stepSin_ = std::sin(3.141592653589793 / periodLength);
-    stepCos_ = std::cos(3.141592653589793 / periodLength);
+    rotation_.stepSin = std::sin(3.141592653589793 / periodLength);
+    rotation_.stepCos = std::cos(3.141592653589793 / periodLength);
     untilResync_ = 0;
 }
 
 void Modulator::Resync() {
     constexpr double kPi = 3.141592653589793;
     const double angle = kPi * phase / periodLength;
-    sine_ = std::sin(angle);
-    cosine_ = std::cos(angle);
+    rotation_.sine = std::sin(angle);
+    rotation_.cosine = std::cos(angle);
     // Restart exactly at every wrap to phase 0, and at least every kResyncInterval samples.
     untilResync_ = std::min(kResyncInterval, period - phase);
 }

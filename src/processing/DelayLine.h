@@ -8,12 +8,28 @@
 
 namespace ulvetta {
 
+// A sine and cosine advanced by a fixed angle per step: a rotation, four multiplications a step.
+struct Rotation {
+    double sine = 0.0, cosine = 1.0;        // of the current angle
+    double stepSin = 0.0, stepCos = 1.0;    // of the step
+
+    void Step() {
+        const double s = sine * stepCos + cosine * stepSin;
+        cosine = cosine * stepCos - sine * stepSin;
+        sine = s;
+    }
+};
+
 // Swings a line's read point over one positive half sine per period: the excursion is
 // depth x sin(pi x phase / periodLength) samples, and the phase wraps to 0 at period.
 //
-// The sine is advanced by a rotation (four multiplications a sample) and recomputed exactly from the phase
-// every kResyncInterval samples, at each wrap and after a change of period; the accumulated rounding stays
-// below 1e-13 of the depth. The phase is only moved by Tick, Advance and the period update.
+// The sine is advanced by a rotation and recomputed exactly from the phase every kResyncInterval samples
+// or sooner, at each wrap and after a change of period; the accumulated rounding stays below 1e-13 of the
+// depth. The phase is only moved by Tick, Advance, Skip and the period update.
+//
+// Two ways to drive it: Tick (and Advance) one sample at a time; or in runs, for a kernel that advances
+// its lines in runs of frames: FramesBeforeResync bounds the run, the rotation() is stepped once per frame
+// (the excursion being depth x its sine), and Skip moves the phase past the run.
 struct Modulator {
     double rate = -1.0;          // Hz; -1 until set
     int32_t sampleRate = -1;     // Hz; -1 until set
@@ -29,10 +45,8 @@ struct Modulator {
     // The current excursion in samples; advances the phase.
     double Tick() {
         if (untilResync_ <= 0) Resync();
-        const double m = depth * sine_;
-        const double s = sine_ * stepCos_ + cosine_ * stepSin_;
-        cosine_ = cosine_ * stepCos_ - sine_ * stepSin_;
-        sine_ = s;
+        const double m = depth * rotation_.sine;
+        rotation_.Step();
         --untilResync_;
         if (++phase >= period) phase = 0;
         return m;
@@ -45,14 +59,25 @@ struct Modulator {
         untilResync_ = 0;
     }
 
+    // Samples the rotation may still be stepped before it must be recomputed: before the next wrap, and
+    // within kResyncInterval of the last recomputation. 0 when it is due.
+    int32_t FramesBeforeResync() const { return untilResync_ > 0 ? untilResync_ : 0; }
+    // Recomputes the sine and cosine exactly from the phase.
+    void Resync();
+    // Moves the phase past n samples whose rotation steps the caller did (n <= FramesBeforeResync()).
+    void Skip(int32_t n) {
+        phase += n;
+        if (phase >= period) phase = 0;
+        untilResync_ -= n;
+    }
+    Rotation& rotation() { return rotation_; }
+
 private:
     static constexpr int32_t kResyncInterval = 256;
     void Update();
-    void Resync();
 
-    // Sine and cosine of pi x phase / periodLength, and of one phase step.
-    double sine_ = 0.0, cosine_ = 1.0, stepSin_ = 0.0, stepCos_ = 1.0;
-    int32_t untilResync_ = 0;  // ticks left before the sine is recomputed from the phase
+    Rotation rotation_;      // of pi x phase / periodLength, and of one phase step
+    int32_t untilResync_ = 0;  // steps left before the sine is recomputed from the phase
 };
 
 struct DelayLine {

@@ -37,14 +37,14 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
 
     NetworkViews v;
     v.Load(*this, 12, 14, false);
-    const RunLine* lines = v.runs.lines;
+    RunLine* lines = v.runs.lines;
     double* echo = preDelayLine.samples.get();
     const int32_t echoLength = preDelayLine.length;
     int32_t k = preDelayLine.writeIndex;
     const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, feedback = echoFeedback;
     const double cutoff = colourCutoff;
     double colourL = colourState, colourR = colourState2, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
-    wetPeak_ = 0.0f;
+    startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
@@ -76,13 +76,9 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
     colourState2 = colourR;
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
-    if (meterSource == 2) {
-        raiseLevel(wetPeak_);
-        cleanSmoothState();
-    }
+    finishMeter();
     flushKernelStates();
     colourState2 = flushTiny(colourState2);
-    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);
 }
 

@@ -22,7 +22,7 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
 
     NetworkViews v;
     v.Load(*this, 20, 20, true);
-    const RunLine* lines = v.runs.lines;
+    RunLine* lines = v.runs.lines;
     const LineRuns& r = v.runs;
     LineView* early = v.early;
     PreDelayView pre = ViewOf(preDelayLine);
@@ -33,7 +33,7 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
     const double eGain = earlyGain;
     double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
-    wetPeak_ = 0.0f;
+    startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
@@ -78,12 +78,8 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
     colourState = colour;
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
-    if (meterSource == 2) {
-        raiseLevel(wetPeak_);
-        cleanSmoothState();
-    }
+    finishMeter();
     flushKernelStates();
-    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);
 }
 

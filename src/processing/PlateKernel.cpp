@@ -34,7 +34,7 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
 
     NetworkViews v;
     v.Load(*this, 12, 14, true);
-    const RunLine* lines = v.runs.lines;
+    RunLine* lines = v.runs.lines;
     LineView* early = v.early;
     PreDelayView pre = ViewOf(preDelayLine);
     const bool usePreDelay = preDelayOn && pre.length > 0;
@@ -43,7 +43,7 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
     const double eGain = earlyGain;
     double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
-    wetPeak_ = 0.0f;
+    startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
@@ -71,12 +71,8 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
     colourState = colour;
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
-    if (meterSource == 2) {
-        raiseLevel(wetPeak_);
-        cleanSmoothState();
-    }
+    finishMeter();
     flushKernelStates();
-    if (meterSource == 1) meterOutput(outLeft, outRight, frames, stride);
     return trimmedLength(outLeft, outRight, frames, stride);
 }
 

@@ -26,14 +26,14 @@ ULVETTA_ALWAYS_INLINE double EarlyLeft(LineView* early, double c) { return Delay
 ULVETTA_ALWAYS_INLINE double EarlyRight(LineView* early, double c) { return AllpassB(early[5], Delay(early[3], c)); }
 
 // The four input diffusers in series.
-ULVETTA_ALWAYS_INLINE double Diffuse(const RunLine* lines, int32_t j, double x) {
+ULVETTA_ALWAYS_INLINE double Diffuse(RunLine* lines, int32_t j, double x) {
     return AllpassA(At(lines[3], j), AllpassA(At(lines[2], j), AllpassA(At(lines[1], j), AllpassA(At(lines[0], j), x))));
 }
 
 // One tank half from its input u: allpass (second form), an optional crossfade with its input, the
 // (possibly modulated) delay, the damping one-pole and the second allpass. Returns the half's output, which
 // the caller writes into the half's end line. first is the index of the half's first allpass (4 or 8).
-ULVETTA_ALWAYS_INLINE double TankHalf(const RunLine* lines, int32_t j, int first, double u, bool crossfade,
+ULVETTA_ALWAYS_INLINE double TankHalf(RunLine* lines, int32_t j, int first, double u, bool crossfade,
                                       double diffusionCoef, double decayCoef, double dampingCoef,
                                       double& dampingState) {
     double v = AllpassB(At(lines[first], j), u);
