@@ -1,6 +1,7 @@
 // The per-sample elements the delay-network kernels are wired from: a delay line used as a plain delay,
 // as an allpass of either sign form, as a write-only or comb line read through output taps; the pre-delay
-// step and output taps. All inline, no allocation, double precision; no stored value is ever denormal.
+// step and output taps. All inline, no allocation, double precision; no stored value is ever denormal
+// (inside a run, while the kernel holds its FlushDenormals).
 //
 // The elements work on one of two plain views of a DelayLine, taken at the start of a block and stored
 // back at its end, so that inside the per-sample loop nothing is reached through the owning records:
@@ -9,8 +10,9 @@
 //   RunFrame  - one frame of a run (LineRuns): a stretch of frames in which no network line's write
 //               position and no output tap wraps, so that frame j of the run writes line k at its starting
 //               position - j and no element steps or tests for a wrap.
-// Both give an element the same three things: the cell at the write position, that position (for the
-// modulated read) and a step, so that each element below is written once for both.
+// Both give an element the same things: the cell at the write position and a store into it, that
+// position (for the modulated read), the modulator's excursion, and a step, so that each element below is
+// written once for both.
 //
 // Index convention of a network line: the write index moves downwards (decremented after each write,
 // wrapping from -1 to length - 1). Before a write, samples[writeIndex] is the oldest entry (delay = length);
@@ -23,6 +25,7 @@
 #include <cstdint>
 
 #include "processing/DelayLine.h"
+#include "processing/FlushDenormals.h"
 
 // The elements run millions of times per second; inlining them even in unoptimised (debug and sanitizer)
 // builds keeps those builds fast enough to run long renders in the tests.
@@ -34,6 +37,13 @@
 
 namespace ulvetta {
 
+// A denormal (or zero) becomes an exact 0.0, so that a decaying tail never leaves denormal numbers in the
+// network, where every operation on them would be many times slower. Only values below 2.2e-308 change,
+// some 300 orders of magnitude below the -313 dB flush threshold, so no output sample is affected. Every
+// value a LineView stores passes here; inside a run the processor does the same where it can
+// (FlushDenormals).
+ULVETTA_ALWAYS_INLINE double NoDenormal(double v) { return std::fabs(v) < DBL_MIN ? 0.0 : v; }
+
 struct LineView {
     double* samples;   // length doubles owned by the DelayLine
     int32_t length;
@@ -42,6 +52,7 @@ struct LineView {
     Modulator* mod;    // null when the line is not modulated
 
     double& cell() const { return samples[writeIndex]; }
+    void store(double v) const { samples[writeIndex] = NoDenormal(v); }
     int32_t position() const { return writeIndex; }
     void step() {
         if (--writeIndex < 0) writeIndex = length - 1;
@@ -65,20 +76,6 @@ struct PreDelayView {
 inline PreDelayView ViewOf(PreDelayLine& l) { return {l.samples.get(), l.length, l.writeIndex}; }
 inline void StoreIndex(PreDelayLine& l, const PreDelayView& v) { l.writeIndex = v.writeIndex; }
 
-// Every value stored into a recirculating line passes here: a denormal (or zero) becomes an exact 0.0, so
-// that a decaying tail never leaves denormal numbers in the network, where every operation on them would
-// be many times slower. Only values below 2.2e-308 change, some 300 orders of magnitude below the
-// -313 dB flush threshold, so no output sample is affected.
-ULVETTA_ALWAYS_INLINE double NoDenormal(double v) { return std::fabs(v) < DBL_MIN ? 0.0 : v; }
-
-// The nearest integer to v, ties to even, for 0 <= v < 2^51: adding and removing 2^52 leaves exactly the
-// rounded value under the default rounding mode (IEEE arithmetic without reassociation, which the build
-// guarantees). Cheaper than a library call on baseline x86-64.
-ULVETTA_ALWAYS_INLINE double RoundToEven(double v) {
-    constexpr double kShift = 4503599627370496.0;  // 2^52
-    return (v + kShift) - kShift;
-}
-
 // A network line over one run (see LineRuns): its write position at the run's first frame and the cell
 // there; for a modulated line, a copy of its modulator's rotation, stepped once per frame of the run.
 struct RunLine {
@@ -90,6 +87,11 @@ struct RunLine {
     double* at;      // samples + writeIndex, set when a run begins
     Rotation rotation;
     double depth;
+    // Set when the excursion keeps the whole part `whole` through the run and neither neighbour of the
+    // modulated read wraps: then the older neighbour in frame j is readAt[-j] and the newer readAt[-j - 1].
+    bool steady;
+    double whole;
+    const double* readAt;  // samples + writeIndex - whole
 };
 
 // One frame of a run of a network line: its storage, length, gain and modulator, its write position in
@@ -102,9 +104,12 @@ struct RunFrame {
     double gain;
     Modulator* mod;
     double* at;    // samples + pos
-    RunLine* run;  // for the modulator's rotation
+    RunLine* run;  // for the modulator's rotation and the steady read
+    int32_t j;     // the frame within the run
 
     double& cell() const { return *at; }
+    // Inside a run the processor flushes denormals (FlushDenormals) where it can.
+    void store(double v) const { *at = FlushDenormals::kByProcessor ? v : NoDenormal(v); }
     int32_t position() const { return pos; }
     void step() const {}  // the run's frame counter moves instead
     double excursion() const {
@@ -116,7 +121,7 @@ struct RunFrame {
 };
 
 ULVETTA_ALWAYS_INLINE RunFrame At(RunLine& l, int32_t j) {
-    return {l.samples, l.length, l.writeIndex - j, l.gain, l.mod, l.at - j, &l};
+    return {l.samples, l.length, l.writeIndex - j, l.gain, l.mod, l.at - j, &l, j};
 }
 
 // Reads a modulated line at a delay of length - m samples, m being the modulator's current excursion,
@@ -125,17 +130,31 @@ ULVETTA_ALWAYS_INLINE RunFrame At(RunLine& l, int32_t j) {
 // (one sample less delay), a negative f towards the older one (one sample more delay), so both weights
 // stay within 0..1 and the read never amplifies.
 template <class Line>
-ULVETTA_ALWAYS_INLINE double ModulatedRead(const Line& l) {
+ULVETTA_ALWAYS_INLINE double InterpolatedRead(const Line& l, double m) {
     // The excursion is never negative (a half sine from 0 to depth): with i its whole part and g its
     // fraction, the read point lies between the entries i and i + 1 samples newer than the oldest, so
     // this is the interpolation above without the rounding and the choice of side.
-    const double m = l.excursion();
     const int32_t i = static_cast<int32_t>(m);
     const double g = m - i;
     int32_t p = l.position() - i;
     if (p < 0) p += l.length;
     const int32_t q = (p == 0 ? l.length : p) - 1;
     return (1.0 - g) * l.samples[p] + g * l.samples[q];
+}
+
+template <class Line>
+ULVETTA_ALWAYS_INLINE double ModulatedRead(const Line& l) {
+    return InterpolatedRead(l, l.excursion());
+}
+
+// In a steady run (RunLine::steady) both neighbours move with the frame like any cell: the same read
+// without splitting the excursion or wrapping.
+ULVETTA_ALWAYS_INLINE double ModulatedRead(const RunFrame& l) {
+    const double m = l.excursion();
+    if (!l.run->steady) return InterpolatedRead(l, m);
+    const double g = m - l.run->whole;
+    const double* older = l.run->readAt - l.j;
+    return (1.0 - g) * older[0] + g * older[-1];
 }
 
 // The line's output before this sample's write: the oldest entry, or the modulated read.
@@ -148,7 +167,7 @@ ULVETTA_ALWAYS_INLINE double ReadLine(const Line& l) {
 template <class Line>
 ULVETTA_ALWAYS_INLINE double Delay(Line&& l, double x) {
     const double z = ReadLine(l);
-    l.cell() = NoDenormal(x);
+    l.store(x);
     l.step();
     return z;
 }
@@ -158,7 +177,7 @@ template <class Line>
 ULVETTA_ALWAYS_INLINE double AllpassA(Line&& l, double x) {
     const double z = ReadLine(l);
     const double v = x - l.gain * z;
-    l.cell() = NoDenormal(v);  // the output uses v as computed: the flush stays off its path
+    l.store(v);  // the output uses v as computed: the flush stays off its path
     l.step();
     return l.gain * v + z;
 }
@@ -168,7 +187,7 @@ template <class Line>
 ULVETTA_ALWAYS_INLINE double AllpassB(Line&& l, double x) {
     const double z = ReadLine(l);
     const double v = x + l.gain * z;
-    l.cell() = NoDenormal(v);
+    l.store(v);
     l.step();
     return z - l.gain * v;
 }
@@ -177,7 +196,7 @@ ULVETTA_ALWAYS_INLINE double AllpassB(Line&& l, double x) {
 // so that its phase keeps running in step with the modulated lines.
 template <class Line>
 ULVETTA_ALWAYS_INLINE void WriteOnly(Line&& l, double x) {
-    l.cell() = NoDenormal(x);
+    l.store(x);
     l.step();
     l.advanceModulator();
 }
@@ -186,7 +205,7 @@ ULVETTA_ALWAYS_INLINE void WriteOnly(Line&& l, double x) {
 template <class Line>
 ULVETTA_ALWAYS_INLINE void CombWrite(Line&& l, double x) {
     const double z = ReadLine(l);
-    l.cell() = NoDenormal(x + l.gain * z);
+    l.store(x + l.gain * z);
     l.step();
 }
 
@@ -235,14 +254,14 @@ struct LineRuns {
     int lineCount = 0, tapCount = 0, modulatedCount = 0;
 
     // Takes lines 0..count-1, and taps 0..taps-1 reading the lines tapLine names (all among those lines).
-    void Load(DelayLine* source, int count, const OutputTap* taps, const int* tapLine, int tapsUsed) {
+    ULVETTA_ALWAYS_INLINE void Load(DelayLine* source, int count, const OutputTap* taps, const int* tapLine, int tapsUsed) {
         lineCount = count;
         tapCount = tapsUsed;
         modulatedCount = 0;
         for (int i = 0; i < lineCount; ++i) {
             DelayLine& l = source[i];
             RunLine& r = lines[i];
-            r = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr, Rotation(), 0.0};
+            r = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr, Rotation(), 0.0, false, 0.0, nullptr};
             if (r.mod) {
                 r.rotation = r.mod->rotation();
                 r.depth = r.mod->depth;
@@ -256,14 +275,14 @@ struct LineRuns {
         }
     }
 
-    void Store(DelayLine* target, OutputTap* taps) const {
+    ULVETTA_ALWAYS_INLINE void Store(DelayLine* target, OutputTap* taps) const {
         for (int i = 0; i < lineCount; ++i) target[i].writeIndex = lines[i].writeIndex;
         for (int k = 0; k < modulatedCount; ++k) lines[modulated[k]].mod->rotation() = lines[modulated[k]].rotation;
         for (int i = 0; i < tapCount; ++i) taps[i].index = tapIndex[i] == tapLength[i] ? 0 : tapIndex[i];
     }
 
     // Starts a run of at most limit (>= 1) frames; returns its length, at least 1.
-    int Begin(int limit) {
+    ULVETTA_ALWAYS_INLINE int Begin(int limit) {
         int n = limit;
         for (int i = 0; i < lineCount; ++i) {
             RunLine& l = lines[i];
@@ -275,12 +294,12 @@ struct LineRuns {
             n = std::min(n, tapIndex[i]);
             tapAt[i] = tapSamples[i] + tapIndex[i] - 1;
         }
-        if (modulatedCount > 0) n = std::min(n, beginModulation());
+        if (modulatedCount > 0) n = beginModulation(n);
         return n;
     }
 
     // Ends a run of n frames: every position moves down by n, wrapping where the run ended at 0.
-    void End(int n) {
+    ULVETTA_ALWAYS_INLINE void End(int n) {
         for (int i = 0; i < lineCount; ++i) {
             RunLine& l = lines[i];
             l.writeIndex -= n;
@@ -291,14 +310,15 @@ struct LineRuns {
     }
 
     // Output tap i in frame j of the run.
-    double Tap(int i, int32_t j) const { return tapAt[i][-j]; }
+    ULVETTA_ALWAYS_INLINE double Tap(int i, int32_t j) const { return tapAt[i][-j]; }
 
 private:
-    // Recomputes every modulator's sine when one of them is due; returns how long the run may last.
-    int32_t beginModulation() {
+    // Recomputes every modulator's sine when one of them is due, and ends the run where a modulator is due
+    // next; where a line is far enough from its wrap, ends it before the modulated read's neighbours would
+    // wrap; then marks the lines whose read stays steady through the run. Returns the run's length.
+    ULVETTA_ALWAYS_INLINE int beginModulation(int n) {
         bool due = false;
         for (int k = 0; k < modulatedCount; ++k) due |= lines[modulated[k]].mod->FramesBeforeResync() == 0;
-        int32_t n = INT32_MAX;
         for (int k = 0; k < modulatedCount; ++k) {
             RunLine& l = lines[modulated[k]];
             if (due) {
@@ -306,6 +326,20 @@ private:
                 l.rotation = l.mod->rotation();
             }
             n = std::min(n, l.mod->FramesBeforeResync());
+            const int32_t room = l.writeIndex - l.mod->depth;
+            if (room >= 1) n = std::min(n, room);
+        }
+        constexpr double kPi = 3.141592653589793;
+        for (int k = 0; k < modulatedCount; ++k) {
+            RunLine& l = lines[modulated[k]];
+            // The excursion of the run's first frame, and how far it can move in n frames (the sine's slope
+            // is at most pi / period per frame), with a margin far above the rotation's rounding.
+            const double m = l.depth * l.rotation.sine;
+            const double reach = l.depth * (kPi / l.mod->periodLength) * n + 1e-6;
+            const int32_t whole = static_cast<int32_t>(m);
+            l.steady = m - reach >= whole && m + reach < whole + 1.0 && l.writeIndex - whole >= n;
+            l.whole = whole;
+            l.readAt = l.samples + (l.writeIndex - whole);
         }
         return n;
     }

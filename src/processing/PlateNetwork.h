@@ -59,20 +59,21 @@ ULVETTA_ALWAYS_INLINE double PlateTapsRight(const LineRuns& r, int32_t j) {
 bool NetworkReady(const ReverbEngine& e, int lineCount, int tapCount, bool early);
 
 // A kernel's network lines and taps, run by run, and its early lines as stepping views, for the length of
-// one block.
+// one block, during which the processor flushes denormals.
 struct NetworkViews {
+    FlushDenormals flushDenormals;
     LineRuns runs;
     LineView early[ReverbEngine::kEarlyLines];
     bool hasEarly = false;
 
-    void Load(ReverbEngine& e, int lines, int tapsUsed, bool withEarly) {
+    ULVETTA_ALWAYS_INLINE void Load(ReverbEngine& e, int lines, int tapsUsed, bool withEarly) {
         runs.Load(e.delayLines, lines, e.outputTaps, network::kTapLine, tapsUsed);
         hasEarly = withEarly;
         if (hasEarly)
             for (int i = 0; i < ReverbEngine::kEarlyLines; ++i) early[i] = ViewOf(e.earlyLines[i]);
     }
 
-    void Store(ReverbEngine& e) const {
+    ULVETTA_ALWAYS_INLINE void Store(ReverbEngine& e) const {
         runs.Store(e.delayLines, e.outputTaps);
         if (hasEarly)
             for (int i = 0; i < ReverbEngine::kEarlyLines; ++i) StoreIndex(e.earlyLines[i], early[i]);

@@ -11,6 +11,10 @@
 
 #include "dsp/NetworkTestSupport.h"
 
+#if defined(__SSE2__)
+#include <xmmintrin.h>
+#endif
+
 namespace ulvetta {
 namespace {
 
@@ -229,6 +233,42 @@ TEST(BlockFrame, MetersReadTheSmoothedPeakOfTheirSignal) {
                 EXPECT_GT(loudest, 1e-3f) << "mode " << mode << " source " << source;
             }
         }
+    }
+}
+
+// Lines holding a tail at the bottom of the double range decay to exact zeros without ever storing a
+// denormal (every operation on one is many times slower), and each block leaves the caller's
+// floating-point mode as it found it.
+TEST(BlockFrame, NetworksDecayToExactZerosNeverDenormals) {
+    for (int mode : {0, 1, 2, 6, 7}) {
+        ReverbEngine e;
+        test::Start(e, 8000, test::FactorySettings(mode));
+        const int lineCount = (mode == 2 || mode == 6) ? 20 : 12;
+        std::vector<DelayLine*> lines;
+        for (int k = 0; k < lineCount; ++k)
+            if (!((mode == 2 || mode == 6) && (k == 16 || k == 18))) lines.push_back(&e.delayLines[k]);  // unused
+        if (mode != 7)
+            for (int k : {0, 2, 3, 5}) lines.push_back(&e.earlyLines[k]);  // the two early paths
+        for (DelayLine* l : lines) {
+            ASSERT_TRUE(l->configured()) << mode;
+            for (int i = 0; i < l->length; ++i) l->samples[i] = (i % 2) ? 1e-305 : -3e-306;
+        }
+        Stereo silence(512), out(512);
+        for (int b = 0; b < 400; ++b) {
+#if defined(__SSE2__)
+            const unsigned mode0 = _mm_getcsr();
+#endif
+            e.ProcessBlock(out.samples.data(), out.samples.data() + 1, silence.samples.data(),
+                           silence.samples.data() + 1, 512, 2, 0, 0);
+#if defined(__SSE2__)
+            ASSERT_EQ(_mm_getcsr(), mode0);
+#endif
+            for (const DelayLine* l : lines)
+                for (int i = 0; i < l->length; ++i)
+                    ASSERT_NE(std::fpclassify(l->samples[i]), FP_SUBNORMAL) << "mode " << mode << " block " << b;
+        }
+        for (const DelayLine* l : lines)
+            for (int i = 0; i < l->length; ++i) ASSERT_EQ(l->samples[i], 0.0) << "mode " << mode;
     }
 }
 
