@@ -187,6 +187,16 @@ private:
                     int stride, int accumulate, int flush);
     int processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                    int stride, int accumulate, int flush);
+    // The delay-network kernels' loops, compiled for what they know of their lines' modulation.
+    template <Reads kDiffusers, Reads kTank>
+    int runPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames, int stride,
+                 int accumulate, int flush);
+    template <Reads kReads>
+    int runExtendedPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                         int stride, int accumulate, int flush);
+    template <Reads kReads>
+    int runEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames, int stride,
+                int accumulate, int flush);
     int processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                            int stride, int accumulate, int flush);
 

@@ -51,6 +51,8 @@ struct LineView {
     double gain;
     Modulator* mod;    // null when the line is not modulated
 
+    static constexpr Reads kReads = Reads::Checked;
+
     double& cell() const { return samples[writeIndex]; }
     void store(double v) const { samples[writeIndex] = NoDenormal(v); }
     int32_t position() const { return writeIndex; }
@@ -95,9 +97,12 @@ struct RunLine {
 };
 
 // One frame of a run of a network line: its storage, length, gain and modulator, its write position in
-// this frame and the cell there. Built by At for each element call; the compiler keeps none of it beyond
-// the arithmetic.
+// this frame and the cell there, and how the kernel reads it. Built by At for each element call; the
+// compiler keeps none of it beyond the arithmetic.
+template <Reads kLineReads = Reads::Checked>
 struct RunFrame {
+    static constexpr Reads kReads = kLineReads;
+
     double* samples;
     int32_t length;
     int32_t pos;
@@ -120,7 +125,10 @@ struct RunFrame {
     void advanceModulator() const {}  // the run's end moves every modulator's phase
 };
 
-ULVETTA_ALWAYS_INLINE RunFrame At(RunLine& l, int32_t j) {
+// A line's frame j of the run; kReads states what the kernel knows of the line's modulation (the caller
+// has made sure of it).
+template <Reads kReads = Reads::Checked>
+ULVETTA_ALWAYS_INLINE RunFrame<kReads> At(RunLine& l, int32_t j) {
     return {l.samples, l.length, l.writeIndex - j, l.gain, l.mod, l.at - j, &l, j};
 }
 
@@ -149,7 +157,8 @@ ULVETTA_ALWAYS_INLINE double ModulatedRead(const Line& l) {
 
 // In a steady run (RunLine::steady) both neighbours move with the frame like any cell: the same read
 // without splitting the excursion or wrapping.
-ULVETTA_ALWAYS_INLINE double ModulatedRead(const RunFrame& l) {
+template <Reads kReads>
+ULVETTA_ALWAYS_INLINE double ModulatedRead(const RunFrame<kReads>& l) {
     const double m = l.excursion();
     if (!l.run->steady) return InterpolatedRead(l, m);
     const double g = m - l.run->whole;
@@ -160,7 +169,12 @@ ULVETTA_ALWAYS_INLINE double ModulatedRead(const RunFrame& l) {
 // The line's output before this sample's write: the oldest entry, or the modulated read.
 template <class Line>
 ULVETTA_ALWAYS_INLINE double ReadLine(const Line& l) {
-    return l.mod ? ModulatedRead(l) : l.cell();
+    if constexpr (Line::kReads == Reads::Plain)
+        return l.cell();
+    else if constexpr (Line::kReads == Reads::Modulated)
+        return ModulatedRead(l);
+    else
+        return l.mod ? ModulatedRead(l) : l.cell();
 }
 
 // Plain delay of length samples (less the modulation excursion when modulated).
@@ -228,6 +242,14 @@ ULVETTA_ALWAYS_INLINE double PreDelayStep(PreDelayView& l, double x) {
     l.samples[l.writeIndex] = x;
     if (++l.writeIndex == l.length) l.writeIndex = 0;
     return out;
+}
+
+// How lines first..last (inclusive) of a network are read: Modulated when every one has a modulator,
+// Plain when none has, Checked otherwise.
+inline Reads ReadsOf(const DelayLine* lines, int first, int last) {
+    int modulated = 0;
+    for (int i = first; i <= last; ++i) modulated += lines[i].mod != nullptr;
+    return modulated == 0 ? Reads::Plain : modulated == last - first + 1 ? Reads::Modulated : Reads::Checked;
 }
 
 // A kernel's network lines and output taps for the length of one block, advanced in runs. Every line's

@@ -8,6 +8,10 @@
 
 namespace ulvetta {
 
+// How a kernel reads a network line, when it knows: never modulated (the oldest entry), always modulated
+// (the interpolated read), or checked at each read.
+enum class Reads { Plain, Modulated, Checked };
+
 // A sine and cosine advanced by a fixed angle per step: a rotation, four multiplications a step.
 struct Rotation {
     double sine = 0.0, cosine = 1.0;        // of the current angle

@@ -16,7 +16,16 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
                               int frames, int stride, int accumulate, int flush) {
     if (!NetworkReady(*this, 12, 14, false) || preDelayLine.length < 2)
         return processDry(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    // The echo modulates no line; the loop is compiled for that, and with a check at every read for
+    // anything else.
+    if (ReadsOf(delayLines, 0, 11) == Reads::Plain)
+        return runEcho<Reads::Plain>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    return runEcho<Reads::Checked>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+}
 
+template <Reads kReads>
+int ReverbEngine::runEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                          int stride, int accumulate, int flush) {
     // The echo meters before latching the flush flag.
     if (frames > 0) {
         decayMeter(frames);
@@ -53,11 +62,11 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
             const double cL = ColourStep(colourL, echo[k], cutoff);
             const double cR = ColourStep(colourR, echo[k1], cutoff);
 
-            const double q = Diffuse(lines, j, (cL + cR) * dc);
+            const double q = Diffuse<kReads>(lines, j, (cL + cR) * dc);
             const double u = decayK * Oldest(At(lines[11], j)) + q;
-            WriteOnly(At(lines[7], j), TankHalf(lines, j, 4, u, false, dc, decayK, dampK, dampLeft));
+            WriteOnly(At(lines[7], j), TankHalf<kReads>(lines, j, 4, u, false, dc, decayK, dampK, dampLeft));
             const double u2 = decayK * OldestAfterWrite(lines[7], j) + q;
-            WriteOnly(At(lines[11], j), TankHalf(lines, j, 8, u2, false, dc, decayK, dampK, dampRight));
+            WriteOnly(At(lines[11], j), TankHalf<kReads>(lines, j, 8, u2, false, dc, decayK, dampK, dampRight));
             const double tankLeft = PlateTapsLeft(v.runs, j);
             const double tankRight = PlateTapsRight(v.runs, j);
 

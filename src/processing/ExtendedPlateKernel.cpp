@@ -9,7 +9,16 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
                                        const float* inRight, int frames, int stride, int accumulate, int flush) {
     if (!NetworkReady(*this, 20, 20, true))
         return processDry(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    // These plates modulate no line; the loop is compiled for that, and with a check at every read for
+    // anything else.
+    if (ReadsOf(delayLines, 0, 19) == Reads::Plain)
+        return runExtendedPlate<Reads::Plain>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    return runExtendedPlate<Reads::Checked>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+}
 
+template <Reads kReads>
+int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                                   int frames, int stride, int accumulate, int flush) {
     // These plates meter before latching the flush flag.
     if (frames > 0) {
         decayMeter(frames);
@@ -41,20 +50,20 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
             const double eL = EarlyLeft(early, c) * eGain;
             const double eR = EarlyRight(early, c) * eGain;
             const double p = usePreDelay ? PreDelayStep(pre, c) : c;
-            double d = Diffuse(lines, j, p);
+            double d = Diffuse<kReads>(lines, j, p);
             if (crossfade) d = dc * d + (1.0 - dc) * p;
 
             const double u = decayK * Oldest(At(lines[11], j)) + d;
-            CombWrite(At(lines[17], j), u);
-            const double t = TankHalf(lines, j, 4, u, crossfade, dc, decayK, dampK, dampLeft);
-            CombWrite(At(lines[12], j), t);
+            CombWrite(At<kReads>(lines[17], j), u);
+            const double t = TankHalf<kReads>(lines, j, 4, u, crossfade, dc, decayK, dampK, dampLeft);
+            CombWrite(At<kReads>(lines[12], j), t);
             WriteOnly(At(lines[13], j), t);
             WriteOnly(At(lines[7], j), t);
 
             const double u2 = decayK * OldestAfterWrite(lines[7], j) + d;
             WriteOnly(At(lines[19], j), u2);
-            const double t2 = TankHalf(lines, j, 8, u2, false, dc, decayK, dampK, dampRight);
-            CombWrite(At(lines[14], j), t2);
+            const double t2 = TankHalf<kReads>(lines, j, 8, u2, false, dc, decayK, dampK, dampRight);
+            CombWrite(At<kReads>(lines[14], j), t2);
             WriteOnly(At(lines[15], j), t2);
             WriteOnly(At(lines[11], j), t2);
 

@@ -24,7 +24,24 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
                                int frames, int stride, int accumulate, int flush) {
     if (!NetworkReady(*this, 12, 14, true))
         return processDry(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    // The warm plate modulates the six tank lines it reads and nothing else, the classic plate nothing;
+    // the loop is compiled for each, and for any other arrangement with a check at every read.
+    const Reads diffusers = ReadsOf(delayLines, 0, 3), tank = ReadsOf(delayLines, 4, 6);
+    if (diffusers == Reads::Plain && tank == ReadsOf(delayLines, 8, 10)) {
+        if (tank == Reads::Plain)
+            return runPlate<Reads::Plain, Reads::Plain>(outLeft, outRight, inLeft, inRight, frames, stride,
+                                                        accumulate, flush);
+        if (tank == Reads::Modulated)
+            return runPlate<Reads::Plain, Reads::Modulated>(outLeft, outRight, inLeft, inRight, frames, stride,
+                                                            accumulate, flush);
+    }
+    return runPlate<Reads::Checked, Reads::Checked>(outLeft, outRight, inLeft, inRight, frames, stride,
+                                                    accumulate, flush);
+}
 
+template <Reads kDiffusers, Reads kTank>
+int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                           int stride, int accumulate, int flush) {
     latchFlush(flush, preDelayOn);
     if (frames <= 0) return 0;
     decayMeter(frames);
@@ -51,14 +68,14 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
             const double eL = EarlyLeft(early, c) * eGain;
             const double eR = EarlyRight(early, c) * eGain;
             const double p = usePreDelay ? PreDelayStep(pre, c) : c;
-            double d = Diffuse(lines, j, p);
+            double d = Diffuse<kDiffusers>(lines, j, p);
             if (crossfade) d = dc * d + (1.0 - dc) * p;
 
             // Left half, fed back from the right half's end line; then the right half, fed from the left's.
             const double u = decayK * Oldest(At(lines[11], j)) + d;
-            WriteOnly(At(lines[7], j), TankHalf(lines, j, 4, u, crossfade, dc, decayK, dampK, dampLeft));
+            WriteOnly(At(lines[7], j), TankHalf<kTank>(lines, j, 4, u, crossfade, dc, decayK, dampK, dampLeft));
             const double u2 = decayK * OldestAfterWrite(lines[7], j) + d;
-            WriteOnly(At(lines[11], j), TankHalf(lines, j, 8, u2, false, dc, decayK, dampK, dampRight));
+            WriteOnly(At(lines[11], j), TankHalf<kTank>(lines, j, 8, u2, false, dc, decayK, dampK, dampRight));
 
             const double wetLeft = PlateTapsLeft(v.runs, j) + eL;
             const double wetRight = PlateTapsRight(v.runs, j) + eR;

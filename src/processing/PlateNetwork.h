@@ -26,21 +26,24 @@ ULVETTA_ALWAYS_INLINE double EarlyLeft(LineView* early, double c) { return Delay
 ULVETTA_ALWAYS_INLINE double EarlyRight(LineView* early, double c) { return AllpassB(early[5], Delay(early[3], c)); }
 
 // The four input diffusers in series.
+template <Reads kReads>
 ULVETTA_ALWAYS_INLINE double Diffuse(RunLine* lines, int32_t j, double x) {
-    return AllpassA(At(lines[3], j), AllpassA(At(lines[2], j), AllpassA(At(lines[1], j), AllpassA(At(lines[0], j), x))));
+    return AllpassA(At<kReads>(lines[3], j),
+                    AllpassA(At<kReads>(lines[2], j), AllpassA(At<kReads>(lines[1], j), AllpassA(At<kReads>(lines[0], j), x))));
 }
 
 // One tank half from its input u: allpass (second form), an optional crossfade with its input, the
 // (possibly modulated) delay, the damping one-pole and the second allpass. Returns the half's output, which
 // the caller writes into the half's end line. first is the index of the half's first allpass (4 or 8).
+template <Reads kReads>
 ULVETTA_ALWAYS_INLINE double TankHalf(RunLine* lines, int32_t j, int first, double u, bool crossfade,
                                       double diffusionCoef, double decayCoef, double dampingCoef,
                                       double& dampingState) {
-    double v = AllpassB(At(lines[first], j), u);
+    double v = AllpassB(At<kReads>(lines[first], j), u);
     if (crossfade) v = diffusionCoef * v + (1.0 - diffusionCoef) * u;
-    const double w = Delay(At(lines[first + 1], j), v);
+    const double w = Delay(At<kReads>(lines[first + 1], j), v);
     dampingState = w + (dampingState - w) * dampingCoef;
-    return AllpassA(At(lines[first + 2], j), decayCoef * dampingState);
+    return AllpassA(At<kReads>(lines[first + 2], j), decayCoef * dampingState);
 }
 
 // The seven-tap sums of the plate, summed in the order written: taps 0..6 read lines 9, 9, 10, 11, 5, 6, 7

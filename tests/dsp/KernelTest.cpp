@@ -272,6 +272,36 @@ TEST(BlockFrame, NetworksDecayToExactZerosNeverDenormals) {
     }
 }
 
+// The kernels run a loop compiled for the modulation their algorithm sets up, and a checked loop for any
+// other arrangement. A modulator of depth 0 reads exactly like no modulator, so an engine whose lines carry
+// an odd mixture of both (checked loop) sounds exactly like one with the usual arrangement.
+TEST(BlockFrame, AnyArrangementOfModulatedLinesIsRead) {
+    for (int mode : {0, 1, 2, 7}) {
+        ReverbEngine usual, odd;
+        test::Start(usual, 44100, test::FactorySettings(mode));
+        test::Start(odd, 44100, test::FactorySettings(mode));
+        for (ReverbEngine* e : {&usual, &odd}) {
+            for (int line : {5, 12}) {
+                DelayLine& l = e->delayLines[line];
+                if (!l.configured()) continue;
+                if (e == &odd && mode == 1) {
+                    l.mod.reset();  // one tank line without a modulator
+                } else if (e == &odd || mode == 1) {
+                    if (!l.mod) {
+                        l.mod.reset(new Modulator);
+                        l.mod->SetModSampleRate(44100);
+                        l.mod->SetModRate(0.3);
+                    }
+                    l.mod->SetModDepth(0);
+                }
+            }
+        }
+        const Stereo in = Noise(20000, 0.5f, 5);
+        const Stereo a = test::Render(usual, in), b = test::Render(odd, in);
+        for (size_t i = 0; i < a.samples.size(); ++i) ASSERT_EQ(a.samples[i], b.samples[i]) << "mode " << mode << " at " << i;
+    }
+}
+
 // The drain trims: once flushing, a block returns the index + 1 of its last frame above -313 dB, and the
 // frames past that are silent.
 TEST(BlockFrame, DrainEndsAndTrimsTheTail) {
