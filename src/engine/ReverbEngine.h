@@ -159,8 +159,8 @@ private:
     // the gains) and runs the wet or the output meter into meterPeak_ when it is the meter's source.
     void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
                    int stride, int accumulate, double wetLeft, double wetRight, double wet, double dry);
-    void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frame,
-                   int stride, int accumulate, double wetLeft, double wetRight) {
+    ULVETTA_ALWAYS_INLINE void mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+                                         int frame, int stride, int accumulate, double wetLeft, double wetRight) {
         mixOutput(outLeft, outRight, inLeft, inRight, frame, stride, accumulate, wetLeft, wetRight, wetGain, dryGain);
     }
     // Starts a block's wet or output meter; finishMeter raises the level to its peak after the block.

@@ -12,15 +12,15 @@ namespace ulvetta {
 
 // A non-finite input sample (from a faulty upstream source) is taken as silence, so that it can never
 // poison the recirculating state or the mix.
-inline float finiteOrZero(float v) { return std::isfinite(v) ? v : 0.0f; }
+ULVETTA_ALWAYS_INLINE float finiteOrZero(float v) { return std::isfinite(v) ? v : 0.0f; }
 
 // A mixed output sample as float. A result below the smallest normal float (-759 dB) becomes an exact
 // zero instead of a denormal: a decaying tail otherwise sends denormal floats through the conversion, the
 // output and the meters for minutes of silence, each many times slower than ordinary arithmetic.
-inline float toOutputFloat(double v) { return std::fabs(v) < 1.1754943508222875e-38 ? 0.0f : static_cast<float>(v); }
+ULVETTA_ALWAYS_INLINE float toOutputFloat(double v) { return std::fabs(v) < 1.1754943508222875e-38 ? 0.0f : static_cast<float>(v); }
 
 // One sample through the meter's 2.1 Hz low-pass (single precision); returns its output.
-inline float ReverbEngine::smooth(float v) {
+ULVETTA_ALWAYS_INLINE float ReverbEngine::smooth(float v) {
     const float* c = smoothCoefs;
     float* s = smoothState;  // x1, x2, y1, y2
     const float y = c[0] * v + c[1] * s[0] + c[2] * s[1] - c[3] * s[2] - c[4] * s[3];
@@ -33,7 +33,7 @@ inline float ReverbEngine::smooth(float v) {
 
 // Writes (or adds) one output frame: wet x wetGain + dry input x dryGain, rounded to float; runs the wet
 // or the output meter when it is the meter's source.
-inline void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
+ULVETTA_ALWAYS_INLINE void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                     int frame, int stride, int accumulate, double wetLeft, double wetRight,
                                     double wet, double dry) {
     const int at = frame * stride;

@@ -27,14 +27,6 @@
 #include "processing/DelayLine.h"
 #include "processing/FlushDenormals.h"
 
-// The elements run millions of times per second; inlining them even in unoptimised (debug and sanitizer)
-// builds keeps those builds fast enough to run long renders in the tests.
-#if defined(__GNUC__)
-#define ULVETTA_ALWAYS_INLINE inline __attribute__((always_inline))
-#else
-#define ULVETTA_ALWAYS_INLINE inline
-#endif
-
 namespace ulvetta {
 
 // A denormal (or zero) becomes an exact 0.0, so that a decaying tail never leaves denormal numbers in the

@@ -6,6 +6,15 @@
 #include <cstdint>
 #include <memory>
 
+// The per-sample steps of the kernels (the delay elements, the mix) run millions of times per second;
+// inlining them always, also into the kernels' large loops and in unoptimised (debug and sanitizer)
+// builds, keeps every build fast enough to run long renders in the tests.
+#if defined(__GNUC__)
+#define ULVETTA_ALWAYS_INLINE inline __attribute__((always_inline))
+#else
+#define ULVETTA_ALWAYS_INLINE inline
+#endif
+
 namespace ulvetta {
 
 // How a kernel reads a network line, when it knows: never modulated (the oldest entry), always modulated
