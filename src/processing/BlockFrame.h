@@ -17,7 +17,9 @@ ULVETTA_ALWAYS_INLINE float finiteOrZero(float v) { return std::isfinite(v) ? v 
 // A mixed output sample as float. A result below the smallest normal float (-759 dB) becomes an exact
 // zero instead of a denormal: a decaying tail otherwise sends denormal floats through the conversion, the
 // output and the meters for minutes of silence, each many times slower than ordinary arithmetic.
-ULVETTA_ALWAYS_INLINE float toOutputFloat(double v) { return std::fabs(v) < 1.1754943508222875e-38 ? 0.0f : static_cast<float>(v); }
+ULVETTA_ALWAYS_INLINE float toOutputFloat(double v) {
+    return std::fabs(v) < 1.1754943508222875e-38 ? 0.0f : static_cast<float>(v);
+}
 
 // One sample through the meter's 2.1 Hz low-pass (single precision); returns its output.
 ULVETTA_ALWAYS_INLINE float ReverbEngine::smooth(float v) {
@@ -33,9 +35,9 @@ ULVETTA_ALWAYS_INLINE float ReverbEngine::smooth(float v) {
 
 // Writes (or adds) one output frame: wet x wetGain + dry input x dryGain, rounded to float; runs the wet
 // or the output meter when it is the meter's source.
-ULVETTA_ALWAYS_INLINE void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
-                                    int frame, int stride, int accumulate, double wetLeft, double wetRight,
-                                    double wet, double dry) {
+ULVETTA_ALWAYS_INLINE void ReverbEngine::mixOutput(float* outLeft, float* outRight, const float* inLeft,
+                                                   const float* inRight, int frame, int stride, int accumulate,
+                                                   double wetLeft, double wetRight, double wet, double dry) {
     const int at = frame * stride;
     const float l = toOutputFloat(wetLeft * wet + finiteOrZero(inLeft[at]) * dry);
     const float r = toOutputFloat(wetRight * wet + finiteOrZero(inRight[at]) * dry);

@@ -268,14 +268,16 @@ struct LineRuns {
     int lineCount = 0, tapCount = 0, modulatedCount = 0;
 
     // Takes lines 0..count-1, and taps 0..taps-1 reading the lines tapLine names (all among those lines).
-    ULVETTA_ALWAYS_INLINE void Load(DelayLine* source, int count, const OutputTap* taps, const int* tapLine, int tapsUsed) {
+    ULVETTA_ALWAYS_INLINE void Load(DelayLine* source, int count, const OutputTap* taps, const int* tapLine,
+                                    int tapsUsed) {
         lineCount = count;
         tapCount = tapsUsed;
         modulatedCount = 0;
         for (int i = 0; i < lineCount; ++i) {
             DelayLine& l = source[i];
             RunLine& r = lines[i];
-            r = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr, Rotation(), 0.0, false, 0.0, nullptr};
+            r = {l.samples.get(), l.length, l.writeIndex, l.gain, l.mod.get(), nullptr, Rotation(), 0.0, false, 0.0,
+                 nullptr};
             if (r.mod) {
                 r.rotation = r.mod->rotation();
                 r.depth = r.mod->depth;

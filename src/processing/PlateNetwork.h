@@ -28,8 +28,10 @@ ULVETTA_ALWAYS_INLINE double EarlyRight(LineView* early, double c) { return Allp
 // The four input diffusers in series.
 template <Reads kReads>
 ULVETTA_ALWAYS_INLINE double Diffuse(RunLine* lines, int32_t j, double x) {
-    return AllpassA(At<kReads>(lines[3], j),
-                    AllpassA(At<kReads>(lines[2], j), AllpassA(At<kReads>(lines[1], j), AllpassA(At<kReads>(lines[0], j), x))));
+    const double a = AllpassA(At<kReads>(lines[0], j), x);
+    const double b = AllpassA(At<kReads>(lines[1], j), a);
+    const double c = AllpassA(At<kReads>(lines[2], j), b);
+    return AllpassA(At<kReads>(lines[3], j), c);
 }
 
 // One tank half from its input u: allpass (second form), an optional crossfade with its input, the

@@ -214,13 +214,14 @@ TEST(BlockFrame, MetersReadTheSmoothedPeakOfTheirSignal) {
                     owner.level = 0.0f;  // stays 0 through the meter's decay, so the level is the block's peak
                     float state[4];
                     std::copy(e.smoothState, e.smoothState + 4, state);
-                    e.ProcessBlock(&out.left(at), &out.right(at), in.samples.data() + 2 * at, in.samples.data() + 2 * at + 1, 512, 2,
-                                   accumulate, 0);
+                    const float* src = in.samples.data() + 2 * at;
+                    e.ProcessBlock(&out.left(at), &out.right(at), src, src + 1, 512, 2, accumulate, 0);
                     const float* c = e.smoothCoefs;
                     float peak = 0.0f;
                     for (size_t i = at; i < at + 512; ++i) {
                         const float v = std::max(std::fabs(out.left(i)), std::fabs(out.right(i)));
-                        const float y = c[0] * v + c[1] * state[0] + c[2] * state[1] - c[3] * state[2] - c[4] * state[3];
+                        const float y =
+                            c[0] * v + c[1] * state[0] + c[2] * state[1] - c[3] * state[2] - c[4] * state[3];
                         state[1] = state[0];
                         state[0] = v;
                         state[3] = state[2];
@@ -298,7 +299,8 @@ TEST(BlockFrame, AnyArrangementOfModulatedLinesIsRead) {
         }
         const Stereo in = Noise(20000, 0.5f, 5);
         const Stereo a = test::Render(usual, in), b = test::Render(odd, in);
-        for (size_t i = 0; i < a.samples.size(); ++i) ASSERT_EQ(a.samples[i], b.samples[i]) << "mode " << mode << " at " << i;
+        for (size_t i = 0; i < a.samples.size(); ++i)
+            ASSERT_EQ(a.samples[i], b.samples[i]) << "mode " << mode << " at " << i;
     }
 }
 
