@@ -33,25 +33,18 @@ int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float*
     v.Load(*this, 20, 20, true);
     RunLine* lines = v.runs.lines;
     const LineRuns& r = v.runs;
-    LineView* early = v.early;
-    PreDelayView pre = ViewOf(preDelayLine);
-    const bool usePreDelay = preDelayOn && pre.length > 0;
-    const bool crossfade = (diffusion != 100);
+    PlateInput front(*this, preDelayLine, v.early);
+    const bool crossfade = front.crossfade;
     const bool weighted = (mode == 6);
-    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, cutoff = colourCutoff;
-    const double eGain = earlyGain;
-    double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
+    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef;
+    double dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
     startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
-            const double c = ColourStep(colour, mono[i], cutoff);
-            const double eL = EarlyLeft(early, c) * eGain;
-            const double eR = EarlyRight(early, c) * eGain;
-            const double p = usePreDelay ? PreDelayStep(pre, c) : c;
-            double d = Diffuse<kReads>(lines, j, p);
-            if (crossfade) d = dc * d + (1.0 - dc) * p;
+            double eL, eR;
+            const double d = front.Step<kReads>(lines, j, mono[i], eL, eR);
 
             const double u = decayK * Oldest(At(lines[11], j)) + d;
             CombWrite(At<kReads>(lines[17], j), u);
@@ -83,8 +76,7 @@ int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float*
         v.runs.End(run);
     }
     v.Store(*this);
-    StoreIndex(preDelayLine, pre);
-    colourState = colour;
+    front.Store(*this, preDelayLine);
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
     finishMeter();

@@ -52,24 +52,17 @@ int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft,
     NetworkViews v;
     v.Load(*this, 12, 14, true);
     RunLine* lines = v.runs.lines;
-    LineView* early = v.early;
-    PreDelayView pre = ViewOf(preDelayLine);
-    const bool usePreDelay = preDelayOn && pre.length > 0;
-    const bool crossfade = (diffusion != 100);
-    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, cutoff = colourCutoff;
-    const double eGain = earlyGain;
-    double colour = colourState, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
+    PlateInput front(*this, preDelayLine, v.early);
+    const bool crossfade = front.crossfade;
+    const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef;
+    double dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
     startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
-            const double c = ColourStep(colour, mono[i], cutoff);
-            const double eL = EarlyLeft(early, c) * eGain;
-            const double eR = EarlyRight(early, c) * eGain;
-            const double p = usePreDelay ? PreDelayStep(pre, c) : c;
-            double d = Diffuse<kDiffusers>(lines, j, p);
-            if (crossfade) d = dc * d + (1.0 - dc) * p;
+            double eL, eR;
+            const double d = front.Step<kDiffusers>(lines, j, mono[i], eL, eR);
 
             // Left half, fed back from the right half's end line; then the right half, fed from the left's.
             const double u = decayK * Oldest(At(lines[11], j)) + d;
@@ -84,8 +77,7 @@ int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft,
         v.runs.End(run);
     }
     v.Store(*this);
-    StoreIndex(preDelayLine, pre);
-    colourState = colour;
+    front.Store(*this, preDelayLine);
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
     finishMeter();

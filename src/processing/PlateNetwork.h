@@ -34,6 +34,43 @@ ULVETTA_ALWAYS_INLINE double Diffuse(RunLine* lines, int32_t j, double x) {
     return AllpassA(At<kReads>(lines[3], j), c);
 }
 
+// The plates' input stage over one block: for each frame the colour low-pass, the two early-reflection
+// paths, the pre-delay and the four input diffusers with their crossfade. Holds the block's coefficients,
+// the colour state and the pre-delay position; Store puts the last two back.
+struct PlateInput {
+    LineView* early;
+    PreDelayView pre;
+    bool usePreDelay, crossfade;
+    double cutoff, diffusionCoef, earlyGain;
+    double colour;
+
+    PlateInput(const ReverbEngine& e, PreDelayLine& preDelay, LineView* earlyLines)
+        : early(earlyLines),
+          pre(ViewOf(preDelay)),
+          usePreDelay(e.preDelayOn && pre.length > 0),
+          crossfade(e.diffusion != 100),
+          cutoff(e.colourCutoff),
+          diffusionCoef(e.diffusionCoef),
+          earlyGain(e.earlyGain),
+          colour(e.colourState) {}
+
+    // The tank's input for mono sample m; eL and eR receive the early paths' output.
+    template <Reads kDiffusers>
+    ULVETTA_ALWAYS_INLINE double Step(RunLine* lines, int32_t j, float m, double& eL, double& eR) {
+        const double c = ColourStep(colour, m, cutoff);
+        eL = EarlyLeft(early, c) * earlyGain;
+        eR = EarlyRight(early, c) * earlyGain;
+        const double p = usePreDelay ? PreDelayStep(pre, c) : c;
+        const double d = Diffuse<kDiffusers>(lines, j, p);
+        return crossfade ? diffusionCoef * d + (1.0 - diffusionCoef) * p : d;
+    }
+
+    void Store(ReverbEngine& e, PreDelayLine& preDelay) const {
+        StoreIndex(preDelay, pre);
+        e.colourState = colour;
+    }
+};
+
 // One tank half from its input u: allpass (second form), an optional crossfade with its input, the
 // (possibly modulated) delay, the damping one-pole and the second allpass. Returns the half's output, which
 // the caller writes into the half's end line. first is the index of the half's first allpass (4 or 8).
