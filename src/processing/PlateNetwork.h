@@ -1,7 +1,8 @@
 // Pieces of the figure-of-eight plate tank shared by the plate, extended-plate and diffused-echo kernels:
-// the colour one-pole, the early-reflection paths, the input diffusers, one tank half and the fourteen-tap
-// output sums; the per-block views of a kernel's lines and taps, advanced in runs; and the check that a
-// mode's lines exist before a kernel touches them. Internal to the processing folder; allocation-free.
+// the colour one-pole, the early-reflection paths, the input diffusers and the plates' input stage built
+// from them, one tank half and the fourteen-tap output sums; the per-block views of a kernel's lines and
+// taps, advanced in runs; and the check that a mode's lines exist before a kernel touches them. Internal
+// to the processing folder; allocation-free.
 #pragma once
 
 #include "engine/NetworkTables.h"
