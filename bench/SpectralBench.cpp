@@ -1,4 +1,4 @@
-// Forward-plus-inverse real transform pairs of 2^6 .. 2^17 points: the spectral library, FFTW 3 (single
+// Forward-plus-inverse real transform pairs of 2^6 .. 2^17 points: our FFT library, FFTW 3 (single
 // precision, FFTW_MEASURE, out of place) and KissFFT (kiss_fftr), registered size by size so that the
 // three run side by side under the same machine load. Ends with a table of ns per pair and the ratios.
 #include <benchmark/benchmark.h>

@@ -1,4 +1,4 @@
-# Real-FFT pairs of the spectral library against FFTW 3 (single precision) and KissFFT, side by side.
+# Real-FFT pairs of our FFT library (ulvetta_spectral) against FFTW 3 (single precision) and KissFFT, side by side.
 # Both peers are benchmark-only dependencies; the module never links them.
 find_package(PkgConfig REQUIRED)
 pkg_check_modules(FFTW3F REQUIRED IMPORTED_TARGET fftw3f)
