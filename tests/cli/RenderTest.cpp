@@ -1,7 +1,7 @@
 #include <cmath>
 
 #include "CliHarness.h"
-#include "Render.h"
+#include "AudioOutput.h"
 
 namespace ulvetta::testing {
 namespace {
