@@ -36,7 +36,7 @@ double parseTailDb(const std::string& text) {
     const std::string s = trim(text);
     const double db = isDecimalNumber(s) ? std::strtod(s.c_str(), nullptr) : NAN;
     if (!std::isfinite(db) || db > 0.0)
-        throw CliError("--tail-db takes a level in dBFS from 0 down, such as -90, not " + inQuotes(text));
+        throw CliError("--tail-db takes a level in dBFS, a finite number of at most 0 such as -90, not " + inQuotes(text));
     return db;
 }
 
