@@ -12,8 +12,6 @@
 
 namespace ulvetta {
 
-namespace {
-
 std::string trim(const std::string& s) {
     size_t b = 0, e = s.size();
     while (b < e && std::isspace(static_cast<unsigned char>(s[b]))) ++b;
@@ -28,8 +26,6 @@ std::string lower(std::string s) {
 
 std::string inQuotes(const std::string& s) { return "\"" + s + "\""; }
 
-// A plain decimal number: optional sign, digits with at most one point, optional exponent. Rejects
-// what strtod would also take but nobody types for a fader (hex, inf, nan, trailing text).
 bool isDecimalNumber(const std::string& s) {
     size_t i = 0;
     if (i < s.size() && (s[i] == '+' || s[i] == '-')) ++i;
@@ -49,6 +45,8 @@ bool isDecimalNumber(const std::string& s) {
     }
     return i == s.size();
 }
+
+namespace {
 
 // The number text of a step count, e.g. -600 with one decimal gives "-60.0".
 std::string stepsAsText(int32_t steps, int32_t decimals) {

@@ -66,6 +66,15 @@ std::string parameterName(ReverbCore& core, int id);
 int findParameter(ReverbCore& core, const std::string& name);
 // Applies one edit; throws CliError for an unknown name or a malformed value.
 void applyEdit(ReverbCore& core, const ParamEdit& edit);
+// Surrounding white space removed.
+std::string trim(const std::string& s);
+// ASCII letters in lower case.
+std::string lower(std::string s);
+// s between double quotes, as messages show names.
+std::string inQuotes(const std::string& s);
+// A plain decimal number: optional sign, digits with at most one point, optional exponent. Rejects
+// what strtod would also take but nobody types for a fader (hex, inf, nan, trailing text).
+bool isDecimalNumber(const std::string& s);
 // A strict whole number: optional sign and decimal digits only, within int32. False otherwise.
 bool parseInteger(const std::string& text, long long minimum, long long maximum, long long& out);
 // The folder for user presets when --dir is not given: $XDG_DATA_HOME/ulvetta/Presets, falling back

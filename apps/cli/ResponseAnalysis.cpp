@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <vector>
 
 namespace ulvetta {
 
@@ -28,14 +29,8 @@ std::vector<double> octaveBand(const float* x, size_t n, double rate, double fc)
     return y;
 }
 
-double t60FromEnergy(const std::vector<double>& energy, double rate) {
-    double t5, t35;
-    if (!schroederSpan(energy, rate, -5.0, -35.0, t5, t35) || t35 <= t5) return 0.0;
-    return 2.0 * (t35 - t5);
-}
-
-}  // namespace
-
+// Seconds from the start at which the Schroeder curve of the energy sequence first falls to fromDb and
+// toDb below its start; false when it never reaches toDb.
 bool schroederSpan(const std::vector<double>& energy, double rate, double fromDb, double toDb, double& tFrom,
                    double& tTo) {
     std::vector<double> tail(energy.size() + 1, 0.0);
@@ -56,9 +51,16 @@ bool schroederSpan(const std::vector<double>& energy, double rate, double fromDb
     return false;
 }
 
+double t60FromEnergy(const std::vector<double>& energy, double rate) {
+    double t5 = 0.0, t35 = 0.0;
+    if (!schroederSpan(energy, rate, -5.0, -35.0, t5, t35) || t35 <= t5) return 0.0;
+    return 2.0 * (t35 - t5);
+}
+
+}  // namespace
+
 ResponseReport analyseResponse(const float* left, const float* right, size_t frames, double rate) {
     ResponseReport r;
-    r.frames = frames;
     for (size_t i = 0; i < frames; ++i) r.peak = std::max({r.peak, std::fabs(double(left[i])), std::fabs(double(right[i]))});
     double* targets[3] = {&r.t60_250, &r.t60_1k, &r.t60_4k};
     const double centres[3] = {250.0, 1000.0, 4000.0};

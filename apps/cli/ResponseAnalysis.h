@@ -3,12 +3,10 @@
 #pragma once
 
 #include <cstddef>
-#include <vector>
 
 namespace ulvetta {
 
 struct ResponseReport {
-    size_t frames = 0;
     double peak = 0.0;
     // Reverberation time (60 dB, extrapolated from the -5..-35 dB range) in the octaves around 250 Hz,
     // 1 kHz and 4 kHz; 0 when the band never falls 35 dB.
@@ -21,10 +19,5 @@ struct ResponseReport {
 
 // left and right hold frames samples each, at rate Hz.
 ResponseReport analyseResponse(const float* left, const float* right, size_t frames, double rate);
-
-// Seconds from the start at which the Schroeder curve of the energy sequence first falls to fromDb and
-// toDb below its start; both negative or zero. Returns false when it never reaches toDb.
-bool schroederSpan(const std::vector<double>& energy, double rate, double fromDb, double toDb, double& tFrom,
-                   double& tTo);
 
 }  // namespace ulvetta

@@ -9,8 +9,9 @@
 #include <iostream>
 #include <string>
 
+#include "AudioInput.h"
 #include "CliSetup.h"
-#include "IrReport.h"
+#include "IrCommand.h"
 #include "ParamsReport.h"
 #include "Render.h"
 #include "filter/ReverbCore.h"
@@ -71,6 +72,10 @@ int run(int argc, char** argv) {
     render->add_option("--block", blockText, "Frames per processing block, 1 to " + std::to_string(kMaxBlockFrames))
         ->type_name("FRAMES");
     render->add_flag("--float", request.forceFloat, "Write 32-bit float even for 16-bit input");
+    std::string tailDbText;
+    auto* tailDb = render->add_option("--tail-db", tailDbText,
+                                      "End the tail once the output has stayed below DB dBFS for a second")
+                       ->type_name("DB");
 
     // params
     auto* params = app.add_subcommand("params", "Show the 17 parameters after the same set-up as render");
@@ -126,6 +131,7 @@ int run(int argc, char** argv) {
             throw CliError("--block takes a whole number of frames from 1 to " + std::to_string(kMaxBlockFrames) +
                            ", not \"" + blockText + "\"");
         request.blockFrames = static_cast<int>(block);
+        if (tailDb->count() > 0) request.tailDb = parseTailDb(tailDbText);
         renderSetup.collect(*render);
         ReverbCore core;
         renderSetup.apply(core);

@@ -1,200 +1,155 @@
 #include <cmath>
 
+#include "AudioOutput.h"
 #include "CliHarness.h"
-#include "Render.h"
 
 namespace ulvetta::testing {
 namespace {
 
-const std::vector<std::string> kDryOnly = {"--set", "Output Level Wet=-Inf.", "--set", "Output Level Dry=0"};
-
-std::vector<std::string> with(std::vector<std::string> args, const std::vector<std::string>& more) {
-    args.insert(args.end(), more.begin(), more.end());
-    return args;
+std::vector<std::string> dryOnly(const std::vector<std::string>& args) {
+    return sets(args, {"Output Level Wet=-Inf.", "Output Level Dry=0"});
 }
 
-TEST_F(CliTest, SixteenBitInputGivesSixteenBitOutputWithTheTailAfterIt) {
-    const size_t frames = 10007;
-    writePcm16("in.wav", 48000, 2, noise16(frames * 2, 1));
-    const RunResult r = run({"render", "in.wav", "out.wav", "--block", "256"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    EXPECT_EQ(r.err, "") << "quiet when stderr is not a terminal";
-    const Audio out = read("out.wav");
-    EXPECT_EQ(out.format, SF_FORMAT_WAV | SF_FORMAT_PCM_16);
-    EXPECT_EQ(out.rate, 48000);
-    EXPECT_EQ(out.channels, 2);
-    // Every input frame comes out, followed by the drained tail: whole blocks, then a shorter last one.
-    EXPECT_GE(out.frames(), static_cast<long long>(frames));
-    EXPECT_LT(out.frames(), static_cast<long long>(frames) + 60LL * 48000);
-    EXPECT_EQ(listing(), (std::vector<std::string>{"in.wav", "out.wav"}));
-}
-
-TEST_F(CliTest, DryPathReproducesSixteenBitInputExactly) {
-    // Full-scale extremes and small values, a length that is no multiple of the block size.
-    std::vector<short> in = noise16(2 * 3001, 2);
-    in[0] = -32768, in[1] = 32767, in[2] = -1, in[3] = 1, in[4] = 0, in[5] = -32767;
-    writePcm16("in.wav", 44100, 2, in);
-    const RunResult r = run(with({"render", "in.wav", "out.wav", "--block", "100"}, kDryOnly));
-    ASSERT_EQ(r.status, 0) << r.err;
-    const Audio out = read("out.wav");
-    ASSERT_GE(out.pcm.size(), in.size());
-    EXPECT_TRUE(std::equal(in.begin(), in.end(), out.pcm.begin()));
-    // The tail of a dry-only render is silence.
-    EXPECT_TRUE(std::all_of(out.pcm.begin() + static_cast<long>(in.size()), out.pcm.end(), [](short s) { return s == 0; }));
-}
-
-TEST_F(CliTest, FloatInputGivesFloatOutputAndForcedFloatKeepsTheSamples) {
-    std::vector<float> in(2 * 1500);
-    for (size_t i = 0; i < in.size(); ++i) in[i] = static_cast<float>(std::sin(0.01 * static_cast<double>(i)) * 1.5);
-    writeFloat("in.wav", 22050, 2, in);
-    RunResult r = run(with({"render", "in.wav", "out.wav"}, kDryOnly));
-    ASSERT_EQ(r.status, 0) << r.err;
-    Audio out = read("out.wav");
-    EXPECT_EQ(out.format, SF_FORMAT_WAV | SF_FORMAT_FLOAT);
-    ASSERT_GE(out.floats.size(), in.size());
-    EXPECT_TRUE(std::equal(in.begin(), in.end(), out.floats.begin())) << "float samples above full scale pass unclipped";
-
-    const std::vector<short> pcm = noise16(2 * 700, 3);
-    writePcm16("pcm.wav", 44100, 2, pcm);
-    r = run(with({"render", "pcm.wav", "f.wav", "--float"}, kDryOnly));
-    ASSERT_EQ(r.status, 0) << r.err;
-    out = read("f.wav");
-    EXPECT_EQ(out.format, SF_FORMAT_WAV | SF_FORMAT_FLOAT);
-    for (size_t i = 0; i < pcm.size(); ++i) ASSERT_EQ(out.floats[i], pcm[i] / 32768.0f) << i;
-}
-
-TEST_F(CliTest, MonoInputBecomesTwoEqualChannels) {
-    const std::vector<short> in = noise16(4000, 4);
-    writePcm16("mono.wav", 44100, 1, in);
-    const RunResult r = run(with({"render", "mono.wav", "out.wav", "--block", "333"}, kDryOnly));
-    ASSERT_EQ(r.status, 0) << r.err;
-    const Audio out = read("out.wav");
-    ASSERT_EQ(out.channels, 2);
-    ASSERT_GE(out.frames(), 4000);
-    for (size_t i = 0; i < in.size(); ++i) {
-        ASSERT_EQ(out.pcm[2 * i], in[i]) << i;
-        ASSERT_EQ(out.pcm[2 * i + 1], in[i]) << i;
+// The sample format follows the input (16-bit stays 16-bit unless --float, anything else is float), the
+// container the output's extension. The bundled sample goes through a factory preset to finite output.
+TEST_F(CliTest, OutputFormatFollowsTheInputAndTheExtension) {
+    fs::copy_file(ULVETTA_DRY_WAV, dir_ / "pcm.wav");
+    write("float.wav", 22050, 1, std::vector<float>(300, 0.25f));
+    const std::pair<std::vector<std::string>, int> cases[] = {
+        {{"render", "pcm.wav", "a.wav", "--preset", "LARGE ROOM *****"}, SF_FORMAT_WAV | SF_FORMAT_PCM_16},
+        {{"render", "pcm.wav", "b.wav", "--float", "--algorithm", "7"}, SF_FORMAT_WAV | SF_FORMAT_FLOAT},
+        {{"render", "pcm.wav", "c.AIFF", "--algorithm", "0"}, SF_FORMAT_AIFF | SF_FORMAT_PCM_16},
+        {{"render", "float.wav", "d.wav"}, SF_FORMAT_WAV | SF_FORMAT_FLOAT},
+        {{"render", "float.wav", "e.caf"}, SF_FORMAT_CAF | SF_FORMAT_FLOAT},
+        {{"render", "float.wav", "f.w64"}, SF_FORMAT_W64 | SF_FORMAT_FLOAT},
+        {{"render", "float.wav", "g.out"}, SF_FORMAT_WAV | SF_FORMAT_FLOAT}};
+    for (const auto& [args, format] : cases) {
+        const RunResult r = run(args);
+        EXPECT_TRUE(r.status == 0 && r.err.empty()) << r.err << " (quiet when stderr is not a terminal)";
+        const Audio out = read(args[2]);
+        EXPECT_EQ(out.format, format) << args[2];
+        EXPECT_TRUE(out.channels == 2 && out.rate == (args[1] == "pcm.wav" ? 44100 : 22050)) << args[2];
+        EXPECT_TRUE(std::all_of(out.floats.begin(), out.floats.end(), [](float v) { return std::isfinite(v); }));
     }
 }
 
-TEST_F(CliTest, SixteenBitOutputTruncatesTowardZeroAndClamps) {
-    // At +6 dB of dry gain every sample roughly doubles: large ones must clamp, negative ones must
-    // truncate toward zero (-3 x 1.995 = -5.98 gives -5, not -6).
-    const std::vector<short> in = {-3, 3, 30000, -30000, -32768, 32767, 1000, -1000};
-    writePcm16("in.wav", 44100, 2, in);
-    const RunResult r =
-        run({"render", "in.wav", "out.wav", "--set", "Output Level Wet=-Inf.", "--set", "Output Level Dry=6"});
-    ASSERT_EQ(r.status, 0) << r.err;
+// Through the dry path alone the input comes back exactly (16-bit extremes, float beyond full scale, a
+// mono channel on both sides, then silence), at block sizes that cut across the 64 Ki-frame file chunks.
+// At +6 dB 16-bit samples roughly double: large ones clamp, others truncate toward zero (-3 gives -5).
+TEST_F(CliTest, DryPathReproducesTheInputExactly) {
+    std::vector<short> pcm = noise16(2 * 150001, 2), mono = noise16(70001, 3), twice(2 * mono.size());
+    pcm[0] = -32768, pcm[1] = 32767;
+    for (size_t i = 0; i < twice.size(); ++i) twice[i] = mono[i / 2];
+    std::vector<float> fl(2 * 70001);
+    for (size_t i = 0; i < fl.size(); ++i) fl[i] = static_cast<float>(std::sin(0.01 * static_cast<double>(i)) * 1.5);
+    write("pcm.wav", 44100, 2, pcm);
+    write("mono.wav", 8000, 1, mono);
+    write("float.wav", 8000, 2, fl);
+    const auto same = [](short s, float f) { return f * 32768.0f == s; };
+    for (const char* block : {"4097", "100", "65536"}) {
+        SCOPED_TRACE(block);
+        for (const char* in : {"pcm.wav", "mono.wav", "float.wav"})
+            ASSERT_EQ(run(dryOnly({"render", in, std::string("out-") + in, "--block", block})).status, 0);
+        const Audio a = read("out-pcm.wav"), b = read("out-mono.wav"), c = read("out-float.wav");
+        ASSERT_TRUE(a.floats.size() > pcm.size() && b.floats.size() > twice.size() && c.floats.size() > fl.size());
+        EXPECT_TRUE(std::equal(pcm.begin(), pcm.end(), a.floats.begin(), same));
+        EXPECT_TRUE(std::all_of(a.floats.begin() + static_cast<long>(pcm.size()), a.floats.end(), [](float v) { return !v; }));
+        EXPECT_TRUE(std::equal(twice.begin(), twice.end(), b.floats.begin(), same));
+        EXPECT_TRUE(std::equal(fl.begin(), fl.end(), c.floats.begin()));
+    }
+    const std::vector<short> loud = {-3, 3, 30000, -30000, -32768, 32767, 1000, -1000};
+    write("loud.wav", 44100, 2, loud);
+    ASSERT_EQ(run(sets({"render", "loud.wav", "out.wav"}, {"Output Level Wet=-Inf.", "Output Level Dry=6"})).status, 0);
     const Audio out = read("out.wav");
-    const double gain = std::pow(10.0, 6.0 / 20.0);
-    for (size_t i = 0; i < in.size(); ++i) {
-        const float y = static_cast<float>(in[i] / 32768.0f * gain) * 32768.0f;
-        const double expected = std::max(-32768.0, std::min(32767.0, std::trunc(static_cast<double>(y))));
-        EXPECT_EQ(out.pcm[i], static_cast<short>(expected)) << "sample " << in[i];
+    for (size_t i = 0; i < loud.size(); ++i) {
+        const double y = static_cast<float>(loud[i] / 32768.0f * std::pow(10.0, 6.0 / 20.0)) * 32768.0f;
+        EXPECT_EQ(out.floats[i] * 32768.0f, std::max(-32768.0, std::min(32767.0, std::trunc(y)))) << loud[i];
     }
-    EXPECT_EQ(out.pcm[0], -5);
-    EXPECT_EQ(out.pcm[2], 32767);
-    EXPECT_EQ(out.pcm[3], -32768);
+    EXPECT_TRUE(out.floats[0] * 32768.0f == -5.0f && floatToPcm16(NAN) == 0 && floatToPcm16(-INFINITY) == -32768);
 }
 
-TEST(FloatToPcm16, MatchesTheFilterConversion) {
-    EXPECT_EQ(floatToPcm16(0.0f), 0);
-    EXPECT_EQ(floatToPcm16(1.0f), 32767);
-    EXPECT_EQ(floatToPcm16(-1.0f), -32768);
-    EXPECT_EQ(floatToPcm16(-1.5f), -32768);
-    EXPECT_EQ(floatToPcm16(1.5f / 32768.0f), 1);
-    EXPECT_EQ(floatToPcm16(-1.5f / 32768.0f), -1);
-    EXPECT_EQ(floatToPcm16(32766.9f / 32768.0f), 32766);
-    EXPECT_EQ(floatToPcm16(INFINITY), 32767);
-    EXPECT_EQ(floatToPcm16(-INFINITY), -32768);
-    EXPECT_EQ(floatToPcm16(NAN), 0);
-}
-
-TEST_F(CliTest, BadInputExitsTwoAndLeavesNoOutput) {
-    writePcm16("in.wav", 44100, 2, noise16(2 * 500, 5));
-    writePcm16("three.wav", 44100, 3, noise16(3 * 500, 6));
-    {
-        std::ofstream f(dir_ / "text.wav");
-        f << "this is not audio\n";
-    }
-    // A WAV header that claims a sample rate of 0.
-    std::string zeroRate = slurp(dir_ / "in.wav");
+// Every refusal exits 2 with one sentence and writes nothing; an existing output stays as it was.
+TEST_F(CliTest, RefusalsExitTwoAndWriteNothing) {
+    write("in.wav", 44100, 2, noise16(2 * 500, 5));
+    write("three.wav", 44100, 3, noise16(3 * 500, 6));
+    std::string zeroRate = slurp(dir_ / "in.wav");  // a WAV header that claims a sample rate of 0
     zeroRate.replace(24, 8, std::string(8, '\0'));
-    std::ofstream(dir_ / "rate0.wav", std::ios::binary) << zeroRate;
-    std::ofstream(dir_ / "short.stp", std::ios::binary) << std::string(87, '\0');
-    // A sparse 4 GiB settings file: judged by its size, never read.
-    std::ofstream(dir_ / "huge.stp", std::ios::binary) << std::string(88, '\0');
-    fs::resize_file(dir_ / "huge.stp", uintmax_t(4) << 30);
-    std::string wrongGuid(88, '\0');
-    wrongGuid[0] = 88;
-    std::ofstream(dir_ / "guid.stp", std::ios::binary) << wrongGuid;
-    // An existing output must survive a failed render unchanged.
-    std::ofstream(dir_ / "keep.wav", std::ios::binary) << "previous output";
+    const std::string wrongGuid = std::string(1, 88) + std::string(87, '\0');
+    for (const auto& [name, bytes] : {std::pair<const char*, std::string>{"text.wav", "this is not audio\n"},
+                                      {"rate0.wav", zeroRate}, {"short.stp", std::string(87, '\0')},
+                                      {"guid.stp", wrongGuid}, {"huge.stp", std::string(88, '\0')},
+                                      {"keep.wav", "previous output"}})
+        std::ofstream(dir_ / name, std::ios::binary) << bytes;
+    fs::resize_file(dir_ / "huge.stp", uintmax_t(4) << 30);  // sparse: judged by its size, never read
     const std::vector<std::string> before = listing();
 
-    const std::vector<std::vector<std::string>> cases = {
-        {"render", "missing.wav", "out.wav"},
-        {"render", "text.wav", "out.wav"},
-        {"render", "three.wav", "out.wav"},
-        {"render", "rate0.wav", "out.wav"},
-        {"render", ".", "out.wav"},
-        {"render", "in.wav", "out.wav", "--set", "Reverb Amount=3"},
-        {"render", "in.wav", "out.wav", "--set", "Pre Delay=forty"},
-        {"render", "in.wav", "out.wav", "--set", "Pre Delay=0x10"},
-        {"render", "in.wav", "out.wav", "--set", "Pre Delay"},
-        {"render", "in.wav", "out.wav", "--set-raw", "1=2.5"},
-        {"render", "in.wav", "out.wav", "--set-raw", "17=2"},
-        {"render", "in.wav", "out.wav", "--set", "Algorithm=huge hall"},
-        {"render", "in.wav", "out.wav", "--algorithm", "8"},
-        {"render", "in.wav", "out.wav", "--algorithm", "two"},
-        {"render", "in.wav", "out.wav", "--preset", "huge hall"},
-        {"render", "in.wav", "out.wav", "--state", "short.stp"},
-        {"render", "in.wav", "out.wav", "--state", "guid.stp"},
-        {"render", "in.wav", "out.wav", "--state", "none.stp"},
-        {"render", "in.wav", "out.wav", "--state", "huge.stp"},
-        {"render", "in.wav", "out.wav", "--block", "0"},
-        {"render", "in.wav", "out.wav", "--block=-64"},
-        {"render", "in.wav", "out.wav", "--block", "100000000"},
-        {"render", "in.wav", "out.wav", "--block", "12x"},
-        {"render", "in.wav", "missing-folder/out.wav"},
-        {"render", "in.wav", "keep.wav", "--set", "Decay=loud"},
-        {"render", "in.wav"},
-    };
+    const std::vector<std::vector<std::string>> renders = {
+        {"missing.wav", "out.wav"}, {"text.wav", "out.wav"}, {"three.wav", "out.wav"}, {"rate0.wav", "out.wav"},
+        {".", "out.wav"}, {"in.wav", "."}, {"in.wav", "missing-folder/out.wav"},
+        {"in.wav"}, {"--set", "Reverb Amount=3"}, {"--set", "Pre Delay=0x10"}, {"--set-raw", "17=2"},
+        {"--algorithm", "8"}, {"--algorithm", "1", "--preset", "large room"}, {"--preset", "huge hall"},
+        {"--state", "short.stp"}, {"--state", "guid.stp"}, {"--state", "none.stp"}, {"--state", "huge.stp"},
+        {"--block", "0"}, {"--block=-64"}, {"--block", "65537"}, {"--block", "12x"}, {"--tail-db", "3"},
+        {"--tail-db", "-inf"}, {"--tail-db", ""}, {"--tail-db"}, {"--set", "Decay=loud"}};
+    std::vector<std::vector<std::string>> cases = {{}, {"mix"}, {"presets"}, {"ir", "--algorithm", "1", "x.wav"},
+                                                   {"ir", "--algorithm", "3", "--rate", "0", "x.wav"},
+                                                   {"ir", "--algorithm", "3", "--rate", "fast", "x.wav"}};
+    for (std::vector<std::string> args : renders) {
+        if (args.size() > 0 && args[0].rfind("--", 0) == 0) args.insert(args.begin(), {"in.wav", "keep.wav"});
+        args.insert(args.begin(), "render");
+        cases.push_back(args);
+    }
     for (const auto& args : cases) {
-        std::string shown;
-        for (const auto& a : args) shown += a + " ";
-        SCOPED_TRACE(shown);
+        SCOPED_TRACE(args.empty() ? "" : args.back());
         expectOneSentence(run(args), 2);
         EXPECT_EQ(listing(), before);
     }
     EXPECT_EQ(slurp(dir_ / "keep.wav"), "previous output");
+    ASSERT_EQ(run(dryOnly({"render", "in.wav", "keep.wav"})).status, 0);
+    EXPECT_GE(read("keep.wav").frames(), 500) << "a complete render replaces it";
+    EXPECT_EQ(listing(), before);
 }
 
-TEST_F(CliTest, BundledDrySampleRendersThroughAFactoryPreset) {
-    fs::copy_file(ULVETTA_DRY_WAV, dir_ / "dry.wav");
-    EXPECT_LT(fs::file_size(dir_ / "dry.wav"), 1u << 20);
-    const Audio in = read("dry.wav");
-    EXPECT_EQ(in.rate, 44100);
-    EXPECT_EQ(in.format & SF_FORMAT_SUBMASK, SF_FORMAT_PCM_16);
-    EXPECT_GE(in.frames(), 4 * 44100);
-    EXPECT_LE(in.frames(), 6 * 44100);
-    const RunResult r = run({"render", "dry.wav", "out.wav", "--preset", "LARGE ROOM *****", "--block", "1024"});
-    ASSERT_EQ(r.status, 0) << r.err;
-    const Audio out = read("out.wav");
-    EXPECT_EQ(out.channels, 2);
-    EXPECT_GE(out.frames(), in.frames());
-    EXPECT_TRUE(std::all_of(out.floats.begin(), out.floats.end(), [](float v) { return std::isfinite(v); }));
-}
-
-TEST_F(CliTest, RenderReplacesAnExistingOutputOnlyWhenComplete) {
-    writePcm16("in.wav", 44100, 2, noise16(2 * 300, 7));
-    std::ofstream(dir_ / "out.wav", std::ios::binary) << "previous output";
-    const RunResult r = run(with({"render", "in.wav", "out.wav"}, kDryOnly));
-    ASSERT_EQ(r.status, 0) << r.err;
-    const Audio out = read("out.wav");
-    EXPECT_GE(out.frames(), 300);
-    EXPECT_EQ(out.channels, 2);
-    EXPECT_EQ(listing(), (std::vector<std::string>{"in.wav", "out.wav"}));
+// An impulse through the diffused echo, wet only, half a second of pre-delay: the output is quiet for
+// that half second after the input, then decays. With --tail-db the output must end right after its last
+// frame at or above the level, or at the input's end if that is later; the samples are those of the full
+// render at the same block size, and where it ends does not depend on the block size.
+TEST_F(CliTest, TailDbEndsAfterTheLastLoudFrameButNeverBeforeTheInput) {
+    const int rate = 22050;
+    const double threshold = std::pow(10.0, -60.0 / 20.0);
+    auto render = [&](const std::string& in, const char* block, const char* db) {
+        std::vector<std::string> args = {"render", in, "out.wav", "--block", block, "--algorithm", "7"};
+        if (db) args.insert(args.end(), {"--tail-db", db});
+        EXPECT_EQ(run(sets(args, {"Pre Delay=500", "Output Level Wet=0", "Output Level Dry=-Inf."})).status, 0);
+        return read("out.wav");
+    };
+    std::vector<float> impulse(2 * 64, 0.0f);
+    impulse[0] = impulse[1] = 1.0f;
+    write("short.wav", rate, 2, impulse);
+    long long lastLoud = -1;
+    for (const char* block : {"64", "1000", "4096"}) {
+        SCOPED_TRACE(block);
+        const Audio full = render("short.wav", block, nullptr);
+        long long previous = lastLoud, firstLoud = -1;
+        for (long long i = 0; i < full.frames(); ++i)
+            if (std::fabs(full.floats[2 * i]) >= threshold || std::fabs(full.floats[2 * i + 1]) >= threshold)
+                lastLoud = i, firstLoud = firstLoud < 0 ? i : firstLoud;
+        ASSERT_TRUE(firstLoud >= 64 + rate / 4 && full.frames() - (lastLoud + 1) > rate)
+            << "the echoes must start after a quiet stretch and end a quiet second before the tail";
+        EXPECT_TRUE(previous < 0 || lastLoud == previous) << lastLoud << " after " << previous;
+        // Inputs that end before the echoes, while they sound (over a second in), and after them.
+        const long long midInput = firstLoud + rate, longInput = lastLoud + rate / 2;
+        ASSERT_GT(lastLoud, midInput);
+        for (const auto& [frames, expected] : {std::pair<long long, long long>{64, lastLoud + 1},
+                                               {midInput, lastLoud + 1}, {longInput, longInput}}) {
+            impulse.resize(2 * static_cast<size_t>(frames), 0.0f);
+            write("in.wav", rate, 2, impulse);
+            const Audio cut = render("in.wav", block, "-60");
+            ASSERT_EQ(cut.frames(), expected) << frames;
+            EXPECT_TRUE(std::equal(cut.floats.begin(), cut.floats.end(), full.floats.begin())) << frames;
+        }
+        impulse.resize(2 * 64);
+    }
 }
 
 }  // namespace
