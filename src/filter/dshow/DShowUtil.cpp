@@ -6,8 +6,6 @@ namespace ulvetta {
 namespace dshow {
 
 std::atomic<long> g_objectCount{0};
-std::atomic<long> g_lockCount{0};
-HMODULE g_module = nullptr;
 
 HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source) {
     if (target == nullptr || source == nullptr) return E_POINTER;
