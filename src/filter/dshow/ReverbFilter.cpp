@@ -78,17 +78,6 @@ WORD EffectiveFormatTag(const AM_MEDIA_TYPE* mt) {
     return 0;
 }
 
-WORD EffectiveFormatTag(const AM_MEDIA_TYPE* mt) {
-    const WAVEFORMATEX* f = WaveFormatOf(mt);
-    if (f == nullptr) return 0;
-    if (f->wFormatTag != WAVE_FORMAT_EXTENSIBLE) return f->wFormatTag;
-    if (mt->cbFormat < sizeof(WAVEFORMATEXTENSIBLE) || f->cbSize < 22) return 0;
-    const auto* x = reinterpret_cast<const WAVEFORMATEXTENSIBLE*>(f);
-    // The KSDATAFORMAT subtypes are byte-identical to the DirectShow media subtypes.
-    if (x->SubFormat == MEDIASUBTYPE_PCM) return WAVE_FORMAT_PCM;
-    if (x->SubFormat == MEDIASUBTYPE_IEEE_FLOAT) return WAVE_FORMAT_IEEE_FLOAT;
-    return 0;
-}
 
 IUnknown* ReverbFilter::CreateInstance(IUnknown* outer, HRESULT* hr) {
     try {
@@ -226,7 +215,7 @@ HRESULT ReverbFilter::SetMediaType(PIN_DIRECTION dir, const AM_MEDIA_TYPE* mt) {
         CritSecLock g(paramLock_);
         automation_.setSampleRate(target.nSamplesPerSec);
     }
-    control_->FormatChanged(dir == PINDIR_INPUT ? 0 : 1);
+    ChangeCore([&] { control_->FormatChanged(dir == PINDIR_INPUT ? 0 : 1); });
     return S_OK;
 }
 
@@ -263,7 +252,9 @@ void ReverbFilter::ReserveScratch() {
 HRESULT ReverbFilter::StartStreaming() {
     ReserveScratch();
     streamStarted_ = true;
-    return control_->StartStreaming() ? S_OK : E_OUTOFMEMORY;
+    if (!ChangeCore([&] { return control_->StartStreaming(); })) return E_OUTOFMEMORY;
+    rebuildPending_ = false;  // starting rebuilt the network whole
+    return S_OK;
 }
 
 HRESULT ReverbFilter::StopStreaming() {
@@ -288,7 +279,17 @@ HRESULT ReverbFilter::Receive(IMediaSample* sample) {
     return ProcessChunked(in, frames, mode, timed, sample);
 }
 
+HRESULT ReverbFilter::RebuildIfPending() {
+    if (!rebuildPending_) return S_OK;
+    // Starting the stream again rebuilds the whole network (it allocates, as a failure is being mended).
+    const HRESULT hr = ComBoundary([&] { return control_->GetCore()->startStreaming() ? S_OK : E_OUTOFMEMORY; });
+    if (SUCCEEDED(hr)) rebuildPending_ = false;
+    return hr;
+}
+
 HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, bool timed, IMediaSample* source) {
+    HRESULT hr = RebuildIfPending();
+    if (FAILED(hr)) return hr;
     const int inAlign = inputFormat_.nBlockAlign;
     const int outAlign = outputFormat_.nBlockAlign;
     bool active;
@@ -304,7 +305,6 @@ HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, bool 
     source->GetTime(&start, &stop);
     int offset = 0;
     bool first = true;
-    HRESULT hr = S_OK;
     do {
         ComRef<IMediaSample> out;
         if (first) {
@@ -330,7 +330,8 @@ HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, bool 
             int length = std::min(frames - offset, capacity - filled);
             if (active) {
                 CritSecLock g(paramLock_);
-                length = automation_.applyChunk(blockPosition_ + offset, frames - offset, length, automationSink_);
+                length = ChangeCore(
+                    [&] { return automation_.applyChunk(blockPosition_ + offset, frames - offset, length, automationSink_); });
             }
             bool shortfall = false;
             const int produced = control_->Process(mode, in + static_cast<size_t>(offset) * inAlign, length,
@@ -355,6 +356,8 @@ HRESULT ReverbFilter::EndOfStream() {
     if (outPin == nullptr || !outPin->IsConnected()) return S_OK;
     const int64_t limit = kMaxDrainSeconds * static_cast<int64_t>(std::max<DWORD>(1, outputFormat_.nSamplesPerSec));
     const WORD align = outputFormat_.nBlockAlign;
+    HRESULT rebuilt = RebuildIfPending();
+    if (FAILED(rebuilt)) return rebuilt;
     int64_t drained = 0;
     for (;;) {
         ComRef<IMediaSample> out;
@@ -423,7 +426,8 @@ STDMETHODIMP ReverbFilter::Load(IStream* stream) {
         // A record larger than the buffer is not ours; a short read leaves part of a record unknown. Both
         // are refused like any other invalid record, without changing a parameter.
         if (size > sizeof buffer || read < wanted) return E_UNEXPECTED;
-        if (!control_->GetCore()->loadState(buffer, static_cast<int32_t>(size))) return E_UNEXPECTED;
+        if (!ChangeCore([&] { return control_->GetCore()->loadState(buffer, static_cast<int32_t>(size)); }))
+            return E_UNEXPECTED;
         control_->RedrawWindows();
         return hr;
     });
@@ -582,7 +586,7 @@ STDMETHODIMP ReverbFilter::SetParam(DWORD index, MP_DATA value) {
         const DWORD first = index == kAllParams ? 0 : index;
         const DWORD last = index == kAllParams ? kMediaParamCount - 1 : index;
         for (DWORD k = first; k <= last; ++k) {
-            automationSink_.apply(static_cast<int32_t>(k), value);
+            ChangeCore([&] { automationSink_.apply(static_cast<int32_t>(k), value); });
             automationSink_.refresh(static_cast<int32_t>(k));
         }
         return S_OK;

@@ -14,6 +14,8 @@
 #include <dshow.h>
 #include <medparam.h>
 
+#include <atomic>
+
 #include "filter/Automation.h"
 #include "filter/ReverbCore.h"
 #include "filter/dshow/Interfaces.h"
@@ -100,6 +102,20 @@ private:
     void captureParameter(int32_t id, float position) override;
     // Sizes the conversion scratch for the larger of the two allocators' buffers.
     void ReserveScratch();
+    // Runs a change of the core's settings. An exception from it (out of memory while the engine
+    // rebuilds its network) may leave the engine half built, so the engine is rebuilt whole before the
+    // next block is processed.
+    template <class Change>
+    auto ChangeCore(Change&& change) -> decltype(change()) {
+        try {
+            return change();
+        } catch (...) {
+            rebuildPending_ = true;
+            throw;
+        }
+    }
+    // Rebuilds the engine after a failed change; E_OUTOFMEMORY while that is still impossible.
+    HRESULT RebuildIfPending();
     // Runs an input block through the core into as many output samples as it needs.
     HRESULT ProcessChunked(const BYTE* in, int frames, int mode, bool timed, IMediaSample* source);
 
@@ -112,6 +128,7 @@ private:
     WAVEFORMATEX inputFormat_{};
     WAVEFORMATEX outputFormat_{};
     bool streamStarted_ = false;
+    std::atomic<bool> rebuildPending_{false};
     int64_t blockPosition_ = 0;
 };
 

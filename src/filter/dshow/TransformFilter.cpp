@@ -102,8 +102,13 @@ ULONG STDMETHODCALLTYPE TransformFilter::NonDelegatingRelease() {
 
 TransformPin* TransformFilter::GetPin(int n) {
     if (!input_) {
-        input_.reset(new (std::nothrow) TransformInputPin(this));
-        if (input_) output_.reset(new (std::nothrow) TransformOutputPin(this));
+        // Both pins or neither, so that a failed creation is tried again by the next call.
+        std::unique_ptr<TransformInputPin> in(new (std::nothrow) TransformInputPin(this));
+        std::unique_ptr<TransformOutputPin> out(new (std::nothrow) TransformOutputPin(this));
+        if (in && out) {
+            input_ = std::move(in);
+            output_ = std::move(out);
+        }
     }
     if (n == 0) return input_.get();
     if (n == 1) return output_.get();
@@ -120,7 +125,7 @@ STDMETHODIMP TransformFilter::Stop() {
     return ComBoundary([&]() -> HRESULT {
         CritSecLock g(stateLock_);
         if (state_ == State_Stopped) return S_OK;
-        GetPin(0);
+        if (GetPin(0) == nullptr) return E_OUTOFMEMORY;
         if (!input_->IsConnected() || !output_->IsConnected()) {
             state_ = State_Stopped;
             eosDelivered_ = false;
@@ -140,7 +145,7 @@ STDMETHODIMP TransformFilter::Stop() {
 }
 
 HRESULT TransformFilter::PauseLocked(ComRef<IPin>& endOfStreamTo) {
-    GetPin(0);
+    if (GetPin(0) == nullptr) return E_OUTOFMEMORY;
     if (state_ == State_Paused) return S_OK;
     if (!input_->IsConnected()) {
         // With nothing to read, downstream gets its end of stream at once (by the caller, unlocked).
@@ -225,7 +230,7 @@ STDMETHODIMP TransformFilter::FindPin(LPCWSTR id, IPin** pin) {
     return ComBoundary([&]() -> HRESULT {
         if (id == nullptr || pin == nullptr) return E_POINTER;
         *pin = nullptr;
-        GetPin(0);
+        if (GetPin(0) == nullptr) return E_OUTOFMEMORY;
         if (wcscmp(id, L"In") == 0)
             *pin = input_.get();
         else if (wcscmp(id, L"Out") == 0)

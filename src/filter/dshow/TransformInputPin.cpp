@@ -42,8 +42,11 @@ STDMETHODIMP TransformInputPin::ReceiveConnection(IPin* connector, const AM_MEDI
             return VFW_E_TYPE_NOT_ACCEPTED;
         }
         SetConnection(connector, mt);
-        hr = filter_->SetMediaType(PINDIR_INPUT, mt);
-        if (SUCCEEDED(hr)) hr = filter_->CompleteConnect(PINDIR_INPUT, connector);
+        // A failure here, thrown or returned, undoes the connection.
+        hr = ComBoundary([&] {
+            HRESULT r = filter_->SetMediaType(PINDIR_INPUT, mt);
+            return SUCCEEDED(r) ? filter_->CompleteConnect(PINDIR_INPUT, connector) : r;
+        });
         if (FAILED(hr)) {
             filter_->BreakConnect(PINDIR_INPUT);
             ClearConnection();

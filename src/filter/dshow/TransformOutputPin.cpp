@@ -48,12 +48,15 @@ HRESULT TransformOutputPin::GetMediaType(int position, AM_MEDIA_TYPE* mt) {
 HRESULT TransformOutputPin::TryConnect(IPin* receivePin, const AM_MEDIA_TYPE* mt) {
     if (CheckMediaType(mt) != S_OK) return VFW_E_TYPE_NOT_ACCEPTED;
     SetConnection(receivePin, mt);
-    HRESULT hr = filter_->SetMediaType(PINDIR_OUTPUT, mt);
+    // A failure in any step, thrown or returned, undoes the connection on both sides.
+    HRESULT hr = ComBoundary([&] { return filter_->SetMediaType(PINDIR_OUTPUT, mt); });
     if (SUCCEEDED(hr)) hr = receivePin->ReceiveConnection(this, mt);
     if (SUCCEEDED(hr)) {
-        hr = receivePin->QueryInterface(IID_IMemInputPin, reinterpret_cast<void**>(input_.put()));
-        if (SUCCEEDED(hr)) hr = DecideAllocator(input_.get());
-        if (SUCCEEDED(hr)) hr = filter_->CompleteConnect(PINDIR_OUTPUT, receivePin);
+        hr = ComBoundary([&] {
+            HRESULT r = receivePin->QueryInterface(IID_IMemInputPin, reinterpret_cast<void**>(input_.put()));
+            if (SUCCEEDED(r)) r = DecideAllocator(input_.get());
+            return SUCCEEDED(r) ? filter_->CompleteConnect(PINDIR_OUTPUT, receivePin) : r;
+        });
         if (FAILED(hr)) receivePin->Disconnect();
     }
     if (FAILED(hr)) {
