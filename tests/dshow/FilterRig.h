@@ -84,37 +84,24 @@ public:
     STDMETHODIMP_(ULONG) AddRef() override { return 2; }
     STDMETHODIMP_(ULONG) Release() override { return 1; }
     STDMETHODIMP Connect(IPin*, const AM_MEDIA_TYPE*) override { return E_NOTIMPL; }
-    STDMETHODIMP ReceiveConnection(IPin* connector, const AM_MEDIA_TYPE* mt) override {
+    STDMETHODIMP ReceiveConnection(IPin* connector, const AM_MEDIA_TYPE*) override {
         connected = connector;
-        format = *reinterpret_cast<const WAVEFORMATEX*>(mt->pbFormat);
         return S_OK;
     }
-    STDMETHODIMP Disconnect() override {
-        connected = nullptr;
-        return S_OK;
-    }
-    STDMETHODIMP ConnectedTo(IPin** pin) override {
-        *pin = connected;
-        return connected ? S_OK : VFW_E_NOT_CONNECTED;
-    }
+    STDMETHODIMP Disconnect() override { connected = nullptr; return S_OK; }
+    STDMETHODIMP ConnectedTo(IPin** pin) override { *pin = connected; return connected ? S_OK : VFW_E_NOT_CONNECTED; }
     STDMETHODIMP ConnectionMediaType(AM_MEDIA_TYPE*) override { return E_NOTIMPL; }
     STDMETHODIMP QueryPinInfo(PIN_INFO* info) override {
         std::memset(info, 0, sizeof *info);
         info->dir = dir_;
         return S_OK;
     }
-    STDMETHODIMP QueryDirection(PIN_DIRECTION* dir) override {
-        *dir = dir_;
-        return S_OK;
-    }
+    STDMETHODIMP QueryDirection(PIN_DIRECTION* dir) override { *dir = dir_; return S_OK; }
     STDMETHODIMP QueryId(LPWSTR*) override { return E_NOTIMPL; }
     STDMETHODIMP QueryAccept(const AM_MEDIA_TYPE*) override { return S_OK; }
     STDMETHODIMP EnumMediaTypes(IEnumMediaTypes**) override { return E_NOTIMPL; }
     STDMETHODIMP QueryInternalConnections(IPin**, ULONG*) override { return E_NOTIMPL; }
-    STDMETHODIMP EndOfStream() override {
-        ++endOfStreams;
-        return S_OK;
-    }
+    STDMETHODIMP EndOfStream() override { ++endOfStreams; return S_OK; }
     STDMETHODIMP BeginFlush() override { return S_OK; }
     STDMETHODIMP EndFlush() override { return S_OK; }
     STDMETHODIMP NewSegment(REFERENCE_TIME, REFERENCE_TIME, double) override { return S_OK; }
@@ -150,7 +137,6 @@ public:
     bool recording = true;  // off: samples are accepted and dropped, nothing is allocated
     int endOfStreams = 0;
     IPin* connected = nullptr;
-    WAVEFORMATEX format{};
 
 private:
     PIN_DIRECTION dir_;
@@ -223,6 +209,14 @@ struct Rig {
         return all;
     }
 };
+
+inline ComRef<IStream> StreamOf(const std::vector<uint8_t>& bytes) {
+    ComRef<IStream> s;
+    CreateStreamOnHGlobal(nullptr, TRUE, s.put());
+    s->Write(bytes.data(), static_cast<ULONG>(bytes.size()), nullptr);
+    s->Seek(LARGE_INTEGER{}, STREAM_SEEK_SET, nullptr);
+    return s;
+}
 
 // Frames of a 16-bit ramp whose two channels share a sign, so the reverb's mono input is not zero.
 inline std::vector<int16_t> Ramp(int frames) {
