@@ -7,6 +7,7 @@
 #include <mmreg.h>
 
 #include <cstring>
+#include <functional>
 #include <vector>
 
 #include "filter/dshow/ReverbFilter.h"
@@ -63,6 +64,16 @@ struct FilterHolder {
         return p;
     }
     ReverbCore* Core() { return filter->Control().GetCore(); }
+    // Formats of 16-bit stereo at a rate on both sides, dry only, streaming started: ready for direct
+    // calls of the processing step.
+    void StartDry16(DWORD rate) {
+        WaveType pcm(WAVE_FORMAT_PCM, 2, rate, 16);
+        filter->SetMediaType(PINDIR_INPUT, pcm);
+        filter->SetMediaType(PINDIR_OUTPUT, pcm);
+        Core()->setValue(kOutputLevelWet, -600);
+        Core()->setValue(kPreDelay, 0);
+        Core()->startStreaming();
+    }
 };
 
 // A pin of a filter that does not exist: enough of IPin (and IMemInputPin downstream) to connect to.
@@ -101,7 +112,11 @@ public:
     STDMETHODIMP QueryAccept(const AM_MEDIA_TYPE*) override { return S_OK; }
     STDMETHODIMP EnumMediaTypes(IEnumMediaTypes**) override { return E_NOTIMPL; }
     STDMETHODIMP QueryInternalConnections(IPin**, ULONG*) override { return E_NOTIMPL; }
-    STDMETHODIMP EndOfStream() override { ++endOfStreams; return S_OK; }
+    STDMETHODIMP EndOfStream() override {
+        ++endOfStreams;
+        if (onEndOfStream) onEndOfStream();
+        return S_OK;
+    }
     STDMETHODIMP BeginFlush() override { return S_OK; }
     STDMETHODIMP EndFlush() override { return S_OK; }
     STDMETHODIMP NewSegment(REFERENCE_TIME, REFERENCE_TIME, double) override { return S_OK; }
@@ -136,6 +151,7 @@ public:
     std::vector<Delivered> delivered;
     bool recording = true;  // off: samples are accepted and dropped, nothing is allocated
     int endOfStreams = 0;
+    std::function<void()> onEndOfStream;
     IPin* connected = nullptr;
 
 private:

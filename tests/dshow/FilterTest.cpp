@@ -1,8 +1,7 @@
 // The filter object in process, without a graph: formats, saved state and its dirty flag, presets,
-// pages, the control interface, media parameters, capture and registration helpers.
+// pages, the control interface, media parameters, capture and the registration path.
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <string>
 
 #include "FilterRig.h"
@@ -244,29 +243,6 @@ TEST(FilterAutomation, CaptureReportsEditorChangesAndHoldsItsCallback) {
         EXPECT_EQ(other.refs, 1);
     }
     EXPECT_EQ(other.refs, 0);  // released with the filter
-}
-
-TEST(FilterStreaming, SixteenBitOutputClampsAndTruncates) {
-    FilterHolder f;
-    WaveType pcm(WAVE_FORMAT_PCM, 2, 44100, 16);
-    f.filter->SetMediaType(PINDIR_INPUT, pcm);
-    f.filter->SetMediaType(PINDIR_OUTPUT, pcm);
-    f.Core()->setValue(kOutputLevelWet, -600);
-    f.Core()->setValue(kOutputLevelDry, 60);  // +6 dB
-    f.Core()->startStreaming();
-    const int16_t in[8] = {32767, -32768, 100, -101, 20000, -20000, 0, 1};
-    int16_t out[8] = {};
-    bool shortfall = true;
-    ASSERT_EQ(f.filter->Control().Process(kModeOrdinary, reinterpret_cast<const BYTE*>(in), 4,
-                                          reinterpret_cast<BYTE*>(out), 4, &shortfall),
-              4);
-    EXPECT_FALSE(shortfall);
-    const double g = std::pow(10.0, 0.3);
-    const int16_t expected[8] = {32767, -32768,
-                                 static_cast<int16_t>(std::trunc(static_cast<float>(100 / 32768.0f * g) * 32768.0)),
-                                 static_cast<int16_t>(std::trunc(static_cast<float>(-101 / 32768.0f * g) * 32768.0)),
-                                 32767, -32768, 0, 1};  // clamped, never wrapped; 1.995 truncates to 1
-    for (int i = 0; i < 8; ++i) EXPECT_EQ(out[i], expected[i]) << i;
 }
 
 TEST(Registration, AModulePathThatDoesNotFitIsAnError) {

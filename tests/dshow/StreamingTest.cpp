@@ -2,6 +2,8 @@
 // whose downstream side asks for small buffers, so that one input sample spreads over several outputs.
 #include <gtest/gtest.h>
 
+#include <cmath>
+
 #include "FilterRig.h"
 
 using namespace ulvetta;
@@ -27,12 +29,7 @@ TEST(Streaming, OneInputSampleSpreadsOverSmallOutputBuffers) {
 
 TEST(Streaming, ABlockLargerThanTheScratchRunsInPieces) {
     FilterHolder f;
-    WaveType pcm(WAVE_FORMAT_PCM, 2, 8000, 16);
-    f.filter->SetMediaType(PINDIR_INPUT, pcm);
-    f.filter->SetMediaType(PINDIR_OUTPUT, pcm);
-    f.Core()->setValue(kOutputLevelWet, -600);
-    f.Core()->setValue(kPreDelay, 0);
-    f.Core()->startStreaming();
+    f.StartDry16(8000);
     const std::vector<int16_t> in = Ramp(5000);  // more than the scratch made before any allocator is known
     std::vector<int16_t> out(in.size());
     bool shortfall = true;
@@ -41,6 +38,25 @@ TEST(Streaming, ABlockLargerThanTheScratchRunsInPieces) {
               5000);
     EXPECT_FALSE(shortfall);
     EXPECT_EQ(out, in);
+}
+
+TEST(Streaming, SixteenBitOutputClampsAndTruncates) {
+    FilterHolder f;
+    f.StartDry16(44100);
+    f.Core()->setValue(kOutputLevelDry, 60);  // +6 dB
+    const int16_t in[8] = {32767, -32768, 100, -101, 20000, -20000, 0, 1};
+    int16_t out[8] = {};
+    bool shortfall = true;
+    ASSERT_EQ(f.filter->Control().Process(kModeOrdinary, reinterpret_cast<const BYTE*>(in), 4,
+                                          reinterpret_cast<BYTE*>(out), 4, &shortfall),
+              4);
+    EXPECT_FALSE(shortfall);
+    const double g = std::pow(10.0, 0.3);
+    const int16_t expected[8] = {32767, -32768,
+                                 static_cast<int16_t>(std::trunc(static_cast<float>(100 / 32768.0f * g) * 32768.0)),
+                                 static_cast<int16_t>(std::trunc(static_cast<float>(-101 / 32768.0f * g) * 32768.0)),
+                                 32767, -32768, 0, 1};  // clamped, never wrapped; 1.995 truncates to 1
+    for (int i = 0; i < 8; ++i) EXPECT_EQ(out[i], expected[i]) << i;
 }
 
 TEST(Streaming, EndOfStreamDrainsTheTailAndPassesTheEndOn) {
@@ -76,6 +92,25 @@ TEST(Streaming, AutomationAppliesInFiveMillisecondChunks) {
             if (out[2 * i] == 0) firstSilent = i;
         EXPECT_EQ(firstSilent, segmentStart == 1000 ? 1000 : 1040);
     }
+}
+
+TEST(Streaming, PausingWithNoInputEndsTheStreamDownstreamWithoutHoldingTheStateLock) {
+    Rig rig(44100, 4096);
+    ASSERT_EQ(rig.filter->GetPin(0)->ReceiveConnection(&rig.upstream, rig.type), S_OK);
+    ASSERT_EQ(rig.filter->GetPin(1)->Connect(&rig.downstream, nullptr), S_OK);
+    ASSERT_EQ(rig.filter->GetPin(0)->Disconnect(), S_OK);
+    // A downstream filter that, while it takes the end of stream, waits for another thread that sets
+    // the filter's clock (which takes the state lock).
+    DWORD waited = WAIT_FAILED;
+    rig.downstream.onEndOfStream = [&] {
+        auto setClock = [](void* f) -> DWORD { return static_cast<IBaseFilter*>(f)->SetSyncSource(nullptr); };
+        HANDLE other = CreateThread(nullptr, 0, setClock, static_cast<IBaseFilter*>(rig.filter), 0, nullptr);
+        waited = WaitForSingleObject(other, 5000);
+        CloseHandle(other);  // a thread still blocked finishes once Pause lets go of the lock
+    };
+    EXPECT_EQ(rig.filter->Pause(), S_OK);
+    EXPECT_EQ(rig.downstream.endOfStreams, 1);
+    EXPECT_EQ(waited, WAIT_OBJECT_0);
 }
 
 TEST(Streaming, StateChangesConnectionsAndTheOfferedType) {

@@ -40,16 +40,6 @@ void DeleteMediaType(AM_MEDIA_TYPE* mt) {
     CoTaskMemFree(mt);
 }
 
-AM_MEDIA_TYPE* CreateMediaType(const AM_MEDIA_TYPE* source) {
-    auto* mt = static_cast<AM_MEDIA_TYPE*>(CoTaskMemAlloc(sizeof(AM_MEDIA_TYPE)));
-    if (mt == nullptr) return nullptr;
-    if (FAILED(CopyMediaType(mt, source))) {
-        CoTaskMemFree(mt);
-        return nullptr;
-    }
-    return mt;
-}
-
 const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt) {
     if (mt == nullptr || mt->pbFormat == nullptr || mt->cbFormat < 16) return nullptr;
     return reinterpret_cast<const WAVEFORMATEX*>(mt->pbFormat);

@@ -21,8 +21,6 @@ HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source);
 void FreeMediaType(AM_MEDIA_TYPE& mt);
 // Frees a media type allocated with CoTaskMemAlloc together with what it owns.
 void DeleteMediaType(AM_MEDIA_TYPE* mt);
-// A media type allocated with CoTaskMemAlloc holding a copy of source; null on failure.
-AM_MEDIA_TYPE* CreateMediaType(const AM_MEDIA_TYPE* source);
 
 // The WAVEFORMATEX of a media type, or null when its format block is shorter than 16 bytes.
 const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt);

@@ -7,8 +7,9 @@
 // held while a sample or end of stream is processed (streaming thread), and Stop takes it after
 // decommitting the input allocator so that a blocked streaming thread is released first. A state change
 // holds no lock while it calls downstream (Pause and Run deliver the end of stream of an unconnected
-// input after releasing the state lock); BeginFlush takes no lock. Every COM method runs its body
-// through ComBoundary.
+// input after releasing the state lock). BeginFlush takes no lock; EndFlush holds the state lock while
+// it passes the flush on, so downstream must not change the filter's state from its EndFlush. Every COM
+// method that can fail by an exception runs its body through ComBoundary.
 //
 // The reference count of the pins is the filter's. A derived filter supplies the format checks, buffer
 // sizing and the processing of samples.

@@ -132,8 +132,9 @@ STDMETHODIMP TransformInputPin::Receive(IMediaSample* sample) {
         // A sample may carry a new media type.
         AM_MEDIA_TYPE* changed = nullptr;
         if (sample->GetMediaType(&changed) == S_OK && changed != nullptr) {
-            HRESULT hr = CheckMediaType(changed) == S_OK ? filter_->SetMediaType(PINDIR_INPUT, changed)
-                                                         : VFW_E_INVALIDMEDIATYPE;
+            HRESULT hr = CheckMediaType(changed) == S_OK
+                             ? ComBoundary([&] { return filter_->SetMediaType(PINDIR_INPUT, changed); })
+                             : VFW_E_INVALIDMEDIATYPE;
             if (SUCCEEDED(hr)) {
                 FreeMediaType(mt_);
                 hr = CopyMediaType(&mt_, changed);
