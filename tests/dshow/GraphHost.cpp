@@ -2,7 +2,6 @@
 
 #include <qedit.h>
 
-#include <cstring>
 #include <mutex>
 
 #include "filter/dshow/DShowUtil.h"
@@ -35,13 +34,11 @@ public:
     STDMETHODIMP SampleCB(double, IMediaSample*) override { return S_OK; }
     STDMETHODIMP BufferCB(double, BYTE* buffer, long length) override {
         std::lock_guard<std::mutex> g(m);
-        sizes.push_back(length);
         bytes.insert(bytes.end(), buffer, buffer + length);
         return S_OK;
     }
     std::mutex m;
     std::vector<unsigned char> bytes;
-    std::vector<long> sizes;
 };
 
 HRESULT FindPin(IBaseFilter* f, PIN_DIRECTION dir, IPin** out) {
@@ -61,21 +58,9 @@ HRESULT FindPin(IBaseFilter* f, PIN_DIRECTION dir, IPin** out) {
     return VFW_E_NOT_FOUND;
 }
 
-class IStreamOnMemory {
-public:
-    static HRESULT Create(const std::vector<unsigned char>& data, IStream** out) {
-        HGLOBAL h = GlobalAlloc(GMEM_MOVEABLE, data.size());
-        if (h == nullptr) return E_OUTOFMEMORY;
-        std::memcpy(GlobalLock(h), data.data(), data.size());
-        GlobalUnlock(h);
-        return CreateStreamOnHGlobal(h, TRUE, out);
-    }
-};
-
 }  // namespace
 
-GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state, Prepare prepare,
-                     void* context, bool replay) {
+GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state, bool replay) {
     GraphResult r;
     Collector collector;
     {
@@ -98,7 +83,9 @@ GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned cha
             ComRef<IPersistStream> persist;
             ComRef<IStream> stream;
             hr = reverb->QueryInterface(IID_IPersistStream, reinterpret_cast<void**>(persist.put()));
-            if (SUCCEEDED(hr)) hr = IStreamOnMemory::Create(state, stream.put());
+            if (SUCCEEDED(hr)) hr = CreateStreamOnHGlobal(nullptr, TRUE, stream.put());
+            if (SUCCEEDED(hr)) hr = stream->Write(state.data(), static_cast<ULONG>(state.size()), nullptr);
+            if (SUCCEEDED(hr)) hr = stream->Seek(LARGE_INTEGER{}, STREAM_SEEK_SET, nullptr);
             if (SUCCEEDED(hr)) hr = persist->Load(stream.get());
             if (FAILED(hr)) return fail("load state", hr);
         }
@@ -126,7 +113,6 @@ GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned cha
         FindPin(renderer.get(), PINDIR_INPUT, nullIn.put());
         hr = graph->Connect(sourceOut.get(), reverbIn.get());  // brings in the WAVE parser
         if (FAILED(hr)) return fail("connect parser to Ulvetta", hr);
-        if (prepare) prepare(reverb.get(), context);
         hr = graph->ConnectDirect(reverbOut.get(), grabIn.get(), nullptr);
         if (FAILED(hr)) return fail("connect Ulvetta to grabber", hr);
         hr = graph->ConnectDirect(grabOut.get(), nullIn.get(), nullptr);
@@ -185,7 +171,6 @@ GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned cha
     }
     const bool pcm16 = r.format.wFormatTag == WAVE_FORMAT_PCM;
     std::lock_guard<std::mutex> g(collector.m);
-    r.sampleSizes = collector.sizes;
     if (pcm16) r.firstPassSamples /= 2; else r.firstPassSamples /= 4;
     if (pcm16) {
         const auto* s = reinterpret_cast<const int16_t*>(collector.bytes.data());

@@ -16,7 +16,6 @@ struct GraphResult {
     std::string step;             // where it failed
     WAVEFORMATEX format{};        // the grabber's connection format
     std::vector<float> samples;   // interleaved output, 16-bit scaled by 1/32768
-    std::vector<long> sampleSizes;  // bytes of each media sample the grabber saw
     bool completed = false;       // EC_COMPLETE arrived
     LONGLONG duration = -1;       // the graph's duration, asked through the filters' seeking pass-through
     size_t firstPassSamples = 0;  // samples collected before a replay
@@ -26,11 +25,8 @@ struct GraphResult {
 std::wstring ModulePath();
 
 // Runs a WAV file through the filter. state: an 88-byte settings record to load first (may be empty).
-// prepare: called with the filter after it joined the graph and its input is connected.
-using Prepare = void (*)(IBaseFilter* filter, void* context);
 // replay: after the end of the stream, seek back to the start while running and play it once more.
-GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state, Prepare prepare = nullptr,
-                     void* context = nullptr, bool replay = false);
+GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state, bool replay = false);
 
 }  // namespace test
 }  // namespace ulvetta

@@ -54,7 +54,4 @@ add_case 96000 f32 7
 # 0.3 s of a constant 0.5 followed by 0.3 s of silence, for the seek test.
 perl -e 'print pack("f<", 0.5) x (2 * 13230), pack("f<", 0) x (2 * 13230)' > dc-silence.raw
 sox -D -t f32 -r 44100 -c 2 dc-silence.raw -e floating-point -b 32 dc-silence-44100-f32.wav
-# Constant 0.5 on both channels, for the automation timing test.
-perl -e 'print pack("f<", 0.5) x (2 * 13230)' > dc.raw
-sox -D -t f32 -r 44100 -c 2 dc.raw -e floating-point -b 32 dc-44100-f32.wav
 echo "made $(wc -l < cases.txt) graph cases in $out"

@@ -6,8 +6,6 @@ namespace ulvetta {
 namespace dshow {
 
 std::atomic<long> g_objectCount{0};
-std::atomic<long> g_lockCount{0};
-HMODULE g_module = nullptr;
 
 HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source) {
     if (target == nullptr || source == nullptr) return E_POINTER;
@@ -40,16 +38,6 @@ void DeleteMediaType(AM_MEDIA_TYPE* mt) {
     if (mt == nullptr) return;
     FreeMediaType(*mt);
     CoTaskMemFree(mt);
-}
-
-AM_MEDIA_TYPE* CreateMediaType(const AM_MEDIA_TYPE* source) {
-    auto* mt = static_cast<AM_MEDIA_TYPE*>(CoTaskMemAlloc(sizeof(AM_MEDIA_TYPE)));
-    if (mt == nullptr) return nullptr;
-    if (FAILED(CopyMediaType(mt, source))) {
-        CoTaskMemFree(mt);
-        return nullptr;
-    }
-    return mt;
 }
 
 const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt) {

@@ -7,14 +7,13 @@
 
 #include <atomic>
 #include <cstdint>
+#include <new>
 
 namespace ulvetta {
 namespace dshow {
 
-// Live COM objects and server locks of the module; DllCanUnloadNow answers from them.
+// Live COM objects of the module; DllCanUnloadNow answers from them and the server locks.
 extern std::atomic<long> g_objectCount;
-extern std::atomic<long> g_lockCount;
-extern HMODULE g_module;
 
 // Deep copy of a media type (the format block is duplicated with CoTaskMemAlloc).
 HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source);
@@ -22,8 +21,6 @@ HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source);
 void FreeMediaType(AM_MEDIA_TYPE& mt);
 // Frees a media type allocated with CoTaskMemAlloc together with what it owns.
 void DeleteMediaType(AM_MEDIA_TYPE* mt);
-// A media type allocated with CoTaskMemAlloc holding a copy of source; null on failure.
-AM_MEDIA_TYPE* CreateMediaType(const AM_MEDIA_TYPE* source);
 
 // The WAVEFORMATEX of a media type, or null when its format block is shorter than 16 bytes.
 const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt);
@@ -31,6 +28,19 @@ const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt);
 // Reference times (100 ns) to samples at a rate: milliseconds first, truncating at each division.
 inline int64_t RefTimeToSamples(REFERENCE_TIME t, uint32_t rate) {
     return (t / 10000) * static_cast<int64_t>(rate) / 1000;
+}
+
+// Runs the body of a COM method so that no exception crosses the interface: running out of memory
+// gives E_OUTOFMEMORY, any other exception E_FAIL. Bodies leave their object consistent when they throw.
+template <class Body>
+HRESULT ComBoundary(Body&& body) noexcept {
+    try {
+        return body();
+    } catch (const std::bad_alloc&) {
+        return E_OUTOFMEMORY;
+    } catch (...) {
+        return E_FAIL;
+    }
 }
 
 // Holds a critical section for its lifetime.

@@ -21,15 +21,16 @@ int16_t ToPcm16(float v) {
     return static_cast<int16_t>(std::trunc(s));
 }
 
-void Grow(std::vector<float>& v, size_t n) {
-    if (v.size() < n) v.assign(n, 0.0f);
-}
+// Frames of scratch before the formats are known: a 40 ms block at 48 kHz.
+constexpr size_t kInitialScratchFrames = 2048;
 
 }  // namespace
 
 ReverbControl::ReverbControl(IUnknown* outer, IPersistStream* persist, const WAVEFORMATEX* inFormat,
                              const WAVEFORMATEX* outFormat)
     : outer_(outer), persist_(persist), core_(new ReverbCore), inFormat_(inFormat), outFormat_(outFormat) {
+    ReserveFrames(kInitialScratchFrames);
+    core_->saveState(cleanState_);
     InitializeCriticalSection(&lock_);
     core_->setBusyIndicator(this);
 }
@@ -37,7 +38,6 @@ ReverbControl::ReverbControl(IUnknown* outer, IPersistStream* persist, const WAV
 ReverbControl::~ReverbControl() {
     core_->stopStreaming();
     core_.reset();
-    segments.clear();
     DeleteCriticalSection(&lock_);
 }
 
@@ -52,14 +52,21 @@ STDMETHODIMP ReverbControl::SetOption(const BYTE* in) {
     if (in == nullptr) return E_POINTER;
     CritSecLock g(lock_);
     option_ = *in;
-    optionChanged_ = true;
     dirty_ = true;
     return S_OK;
 }
 
 bool ReverbControl::IsDirty() {
+    uint8_t now[kCoreStateSize];
+    core_->saveState(now);
     CritSecLock g(lock_);
-    return dirty_;
+    return dirty_ || std::memcmp(now, cleanState_, sizeof now) != 0;
+}
+
+void ReverbControl::MarkClean(const uint8_t* savedState) {
+    CritSecLock g(lock_);
+    std::memcpy(cleanState_, savedState, sizeof cleanState_);
+    dirty_ = false;
 }
 
 STDMETHODIMP ReverbControl::GetFormat(WAVEFORMATEX* out, int direction) {
@@ -116,15 +123,22 @@ void ReverbControl::RedrawWindows() {
 
 template <class F>
 void ReverbControl::ForEachWindow(F notify) {
-    CritSecLock g(lock_);
-    for (Window& w : windows_) {
+    // A window's code may call back into this object (a redraw runs its paint code at once), so the
+    // list is copied under the lock and the windows are called without it.
+    Window copy[2];
+    {
+        CritSecLock g(lock_);
+        std::copy(std::begin(windows_), std::end(windows_), copy);
+    }
+    for (const Window& w : copy) {
         if (w.window == nullptr) continue;
-        if (!IsWindow(w.window)) {  // gone: its entry is freed instead
-            w.window = nullptr;
-            w.id = 0;
+        if (IsWindow(w.window)) {
+            notify(w.window, w.id);
             continue;
         }
-        notify(w.window, w.id);
+        CritSecLock g(lock_);  // gone: its entry is freed, unless it was registered anew meanwhile
+        for (Window& e : windows_)
+            if (e.window == w.window) e = Window{};
     }
 }
 
@@ -132,8 +146,6 @@ bool ReverbControl::StartStreaming() {
     {
         CritSecLock g(lock_);
         inKnown_ = outKnown_ = true;
-        optionChanged_ = false;
-        started_ = true;
     }
     return core_->startStreaming();
 }
@@ -144,42 +156,51 @@ void ReverbControl::StopStreaming() { core_->stopStreaming(); }
 void ReverbControl::begin() { previousCursor_ = SetCursor(LoadCursorW(nullptr, MAKEINTRESOURCEW(32514))); }
 void ReverbControl::end() { SetCursor(previousCursor_); }
 
+void ReverbControl::ReserveFrames(size_t frames) {
+    if (frames <= scratchFrames_) return;
+    std::vector<float> in(frames * 2), out(frames * 2);
+    scratchIn_.swap(in);
+    scratchOut_.swap(out);
+    scratchFrames_ = frames;
+}
+
 int ReverbControl::Process(int mode, const BYTE* in, int inFrames, BYTE* out, int outCapacity, bool* shortfall) {
     const int frames = in ? std::min(inFrames, outCapacity) : outCapacity;
-    if (frames <= 0) {
-        *shortfall = frames < (in ? inFrames : outCapacity);
-        return 0;
-    }
-    const size_t samples = static_cast<size_t>(frames) * 2;
     const bool pcm16 = outFormat_->wFormatTag == WAVE_FORMAT_PCM;
-    const int restart = mode == kModeDiscontinuity;
-    const int flush = mode == kModeDrain;
-    int produced;
-    if (!pcm16) {
-        const float* src;
-        if (in) {
-            src = reinterpret_cast<const float*>(in);
-        } else {
-            Grow(silence_, samples);
-            src = silence_.data();
-        }
-        float* dst = reinterpret_cast<float*>(out);
-        produced = core_->processStereo(src, src + 1, dst, dst + 1, frames, 2, restart, flush, 0);
-    } else {
-        Grow(scratchIn_, samples);
-        Grow(scratchOut_, samples);
-        if (in) {
-            const int16_t* s = reinterpret_cast<const int16_t*>(in);
-            for (size_t i = 0; i < samples; ++i) scratchIn_[i] = s[i] * 3.0517578125e-5f;
-        } else {
-            std::fill(scratchIn_.begin(), scratchIn_.begin() + samples, 0.0f);
-        }
-        produced = core_->processStereo(scratchIn_.data(), scratchIn_.data() + 1, scratchOut_.data(),
-                                        scratchOut_.data() + 1, frames, 2, restart, flush, 0);
-        int16_t* d = reinterpret_cast<int16_t*>(out);
-        for (size_t i = 0; i < static_cast<size_t>(produced) * 2; ++i) d[i] = ToPcm16(scratchOut_[i]);
+    const size_t inBytes = pcm16 ? 4 : 8;  // one stereo frame
+    // Float input goes to the core directly in one call; anything that passes through the scratch is
+    // processed in pieces of its size.
+    const int piece = (pcm16 || in == nullptr) ? static_cast<int>(scratchFrames_) : std::max(frames, 1);
+    int produced = 0;
+    for (int done = 0; done < frames;) {
+        const int n = std::min(piece, frames - done);
+        const int got = ProcessPiece(mode, done == 0, in ? in + done * inBytes : nullptr, out + produced * inBytes, n);
+        produced += got;
+        done += n;
+        if (got < n) break;  // the tail has ended: nothing more comes out of this block
     }
-    *shortfall = produced < frames;
+    *shortfall = produced < frames || (frames <= 0 && (in ? inFrames : outCapacity) > 0);
+    return produced;
+}
+
+int ReverbControl::ProcessPiece(int mode, bool first, const BYTE* in, BYTE* out, int frames) {
+    const size_t samples = static_cast<size_t>(frames) * 2;
+    const int restart = mode == kModeDiscontinuity && first;
+    const int flush = mode == kModeDrain;
+    if (in == nullptr) std::fill(scratchIn_.begin(), scratchIn_.begin() + samples, 0.0f);
+    if (outFormat_->wFormatTag != WAVE_FORMAT_PCM) {
+        const float* src = in ? reinterpret_cast<const float*>(in) : scratchIn_.data();
+        float* dst = reinterpret_cast<float*>(out);
+        return core_->processStereo(src, src + 1, dst, dst + 1, frames, 2, restart, flush, 0);
+    }
+    if (in) {
+        const int16_t* s = reinterpret_cast<const int16_t*>(in);
+        for (size_t i = 0; i < samples; ++i) scratchIn_[i] = s[i] * 3.0517578125e-5f;
+    }
+    const int produced = core_->processStereo(scratchIn_.data(), scratchIn_.data() + 1, scratchOut_.data(),
+                                              scratchOut_.data() + 1, frames, 2, restart, flush, 0);
+    int16_t* d = reinterpret_cast<int16_t*>(out);
+    for (size_t i = 0; i < static_cast<size_t>(produced) * 2; ++i) d[i] = ToPcm16(scratchOut_[i]);
     return produced;
 }
 

@@ -1,9 +1,10 @@
 // ReverbControl: the part of the filter that owns the ReverbCore and serves IReverbControl to the editor.
-// It also holds the automation segment list (guarded by the filter's paramLock) and runs the sample
-// conversion around the core's processing call.
+// It also runs the sample conversion around the core's processing call and keeps the dirty state of
+// the saved settings.
 //
-// Threads: GetOption/SetOption/RegisterWindow take this object's small lock; Process runs on the
-// streaming thread; the core takes its own lock inside every call.
+// Threads: GetOption/SetOption/RegisterWindow and the dirty state take this object's small lock, which
+// is never held while calling a window; Process runs on the streaming thread; the core takes its own
+// lock inside every call.
 #pragma once
 
 #include <windows.h>
@@ -12,21 +13,12 @@
 #include <memory>
 #include <vector>
 
+#include "filter/CoreState.h"
 #include "filter/ReverbCore.h"
 #include "filter/dshow/Interfaces.h"
 
 namespace ulvetta {
 namespace dshow {
-
-// One automation segment in sample time of the input stream.
-struct EnvelopeSegment {
-    int32_t paramId;
-    int64_t startSample;  // 64-bit so that long streams at high rates cannot wrap
-    int64_t endSample;
-    float startValue;  // position 0..1, or the integer value for parameters automated by value
-    float endValue;
-    bool jump;  // bit 0 of the segment's curve type; stored, not used by the playback
-};
 
 // Processing modes of Process.
 enum ProcessMode { kModeDiscontinuity = 0, kModeOrdinary = 1, kModeDrain = 2 };
@@ -59,43 +51,47 @@ public:
     void StopStreaming();
     // Redraws every registered window (after a state was loaded).
     void RedrawWindows();
+    // True after SetOption or when the settings differ from those last saved with MarkClean.
     bool IsDirty();
+    void MarkClean(const uint8_t* savedState);
 
-    // Runs one block through the core with the stream's sample format. in is null for the tail drain
-    // (silence is processed). Returns the frames produced; *shortfall is set when fewer than asked.
+    // Sizes the conversion scratch for blocks of up to frames (graph thread, before streaming).
+    void ReserveFrames(size_t frames);
+    // Runs one block through the core with the stream's sample format, in pieces of the scratch size
+    // when the block is larger. in is null for the tail drain (silence is processed). Returns the
+    // frames produced; *shortfall is set when fewer than asked. Allocates nothing once sized.
     int Process(int mode, const BYTE* in, int inFrames, BYTE* out, int outCapacity, bool* shortfall);
-
-    // The automation segments; guarded by the filter's paramLock.
-    std::vector<EnvelopeSegment> segments;
 
 private:
     void begin() override;
     void end() override;
-    // Calls notify(window, id) for every registered window that still exists, clearing the others.
+    // Calls notify(window, id) for every registered window that still exists, clearing the others;
+    // the window calls run after this object's lock is released.
     template <class F>
     void ForEachWindow(F notify);
+    int ProcessPiece(int mode, bool first, const BYTE* in, BYTE* out, int frames);
 
     IUnknown* outer_;
     IPersistStream* persist_;
     std::unique_ptr<ReverbCore> core_;
     CRITICAL_SECTION lock_;
     BYTE option_ = 0;
-    bool optionChanged_ = true;
     bool dirty_ = false;
+    uint8_t cleanState_[kCoreStateSize] = {};  // the settings as last saved (or at construction)
     struct Window {
         HWND window;
         WORD id;
     } windows_[2] = {};
-    bool started_ = false;
     const WAVEFORMATEX* inFormat_;
     const WAVEFORMATEX* outFormat_;
     bool inKnown_ = false;
     bool outKnown_ = false;
     HCURSOR previousCursor_ = nullptr;
-    // Scratch of the 16-bit path and of the drain; they grow to the largest block, never shrink.
+    // Interleaved stereo scratch of the 16-bit path and of the drain's silence, scratchFrames_ frames
+    // each; sized off the streaming thread.
+    size_t scratchFrames_ = 0;
     std::vector<float> scratchIn_;
     std::vector<float> scratchOut_;
-    std::vector<float> silence_;
 };
 
 }  // namespace dshow

@@ -1,10 +1,14 @@
 // The reverb as a DirectShow transform filter.
 //
-// Streaming: Receive converts each input sample (16-bit PCM through float scratch, float directly), runs
-// it through the core in one call or, while automation envelopes are active, in 5 ms chunks with the
-// envelope values applied before each chunk, and delivers the result in output samples of the
-// downstream allocator's size (an input larger than an output buffer continues in further samples without
-// times). EndOfStream feeds silence with the flush flag until the core reports that the tail has ended.
+// Streaming (upstream's streaming thread): Receive converts each input sample (16-bit PCM through float
+// scratch sized before streaming starts, float directly), runs it through the core in one call or,
+// while automation envelopes are active, in 5 ms chunks with the envelope values applied before each
+// chunk, and delivers the result in output samples of the downstream allocator's size (an input larger
+// than an output buffer continues in further samples without times). EndOfStream feeds silence with the
+// flush flag until the core reports that the tail has ended. Nothing on this path allocates.
+//
+// Control (graph and editor threads): formats, saved state, presets, media parameters and the capture
+// callback. Every COM method runs its body through ComBoundary, so no exception reaches a caller.
 #include "filter/dshow/ReverbFilter.h"
 
 #include <mmreg.h>
@@ -26,32 +30,27 @@ constexpr DWORD kMediaParamCount = kSoundParamCount;
 // The longest tail the drain delivers before it ends the stream regardless, in seconds of audio: a
 // safety net so that a host can never hang at end of stream.
 constexpr int64_t kMaxDrainSeconds = 300;
-// During a ramp the editor is refreshed every this many chunks.
-constexpr int32_t kRefreshEveryChunks = 70;
 
-// Builds the plain stereo type offered downstream from a (plain or extensible) input type.
-HRESULT BuildStereoType(const AM_MEDIA_TYPE* src, AM_MEDIA_TYPE* dst) {
-    const WAVEFORMATEX* f = WaveFormatOf(src);
-    if (f == nullptr) return E_INVALIDARG;
-    auto* w = static_cast<WAVEFORMATEX*>(CoTaskMemAlloc(sizeof(WAVEFORMATEX)));
-    if (w == nullptr) return E_OUTOFMEMORY;
-    std::memcpy(w, f, 16);
-    w->wFormatTag = EffectiveFormatTag(src);
+// The type offered downstream: a copy of the input type as a stereo type (cbSize 0 when the format
+// block is longer than 16 bytes, two channels, block align and byte rate recomputed).
+HRESULT StereoCopyOf(const AM_MEDIA_TYPE* src, AM_MEDIA_TYPE* dst) {
+    if (WaveFormatOf(src) == nullptr) return E_INVALIDARG;
+    HRESULT hr = CopyMediaType(dst, src);
+    if (FAILED(hr)) return hr;
+    auto* w = reinterpret_cast<WAVEFORMATEX*>(dst->pbFormat);
+    if (dst->cbFormat > 16) w->cbSize = 0;
     w->nChannels = 2;
     w->nBlockAlign = static_cast<WORD>(w->wBitsPerSample / 8 * 2);
     w->nAvgBytesPerSec = w->nSamplesPerSec * w->nBlockAlign;
-    w->cbSize = 0;
-    *dst = *src;
-    dst->pUnk = nullptr;
-    dst->formattype = FORMAT_WaveFormatEx;
-    if (w->wFormatTag == WAVE_FORMAT_PCM) dst->subtype = MEDIASUBTYPE_PCM;
-    if (w->wFormatTag == WAVE_FORMAT_IEEE_FLOAT) dst->subtype = MEDIASUBTYPE_IEEE_FLOAT;
-    dst->bFixedSizeSamples = TRUE;
-    dst->lSampleSize = w->nBlockAlign;
-    dst->cbFormat = sizeof(WAVEFORMATEX);
-    dst->pbFormat = reinterpret_cast<BYTE*>(w);
     return S_OK;
 }
+
+// Parameter records for the media-parameter descriptions; false for an index that is not published.
+bool Describe(ReverbCore* core, DWORD index, ParamDesc& d) {
+    return index < kMediaParamCount && core->getParamDesc(static_cast<int32_t>(index), d);
+}
+
+bool ShowsUnit(const ParamDesc& d) { return d.automationType == 2 || d.automationType == 3; }
 
 // Copies ANSI text into a wide buffer of capacity characters, always terminated.
 void AnsiToWide(const char* text, WCHAR* out, int capacity) {
@@ -79,29 +78,34 @@ WORD EffectiveFormatTag(const AM_MEDIA_TYPE* mt) {
     return 0;
 }
 
+
 IUnknown* ReverbFilter::CreateInstance(IUnknown* outer, HRESULT* hr) {
     try {
-        auto* f = new ReverbFilter(outer, hr);
-        if (FAILED(*hr)) {
-            delete f;
-            return nullptr;
-        }
+        auto* f = new ReverbFilter(outer);
+        *hr = S_OK;
         return f->InnerUnknown();
     } catch (const std::bad_alloc&) {
         *hr = E_OUTOFMEMORY;
-        return nullptr;
+    } catch (...) {
+        *hr = E_FAIL;
     }
+    return nullptr;
 }
 
-ReverbFilter::ReverbFilter(IUnknown* outer, HRESULT* hr) : TransformFilter(CLSID_UlvettaFilter, outer) {
+ReverbFilter::ReverbFilter(IUnknown* outer)
+    : TransformFilter(CLSID_UlvettaFilter, outer),
+      control_(new ReverbControl(outer_, static_cast<IPersistStream*>(this), &inputFormat_, &outputFormat_)),
+      automationSink_(*control_->GetCore()) {
     InitializeCriticalSection(&paramLock_);
-    control_.reset(new ReverbControl(outer_, static_cast<IPersistStream*>(this), &inputFormat_, &outputFormat_));
+    InitializeCriticalSection(&callbackLock_);
     const BYTE defaultOption = 0;  // the option byte of the "(Default)" host preset
     control_->SetOption(&defaultOption);
-    *hr = S_OK;
 }
 
 ReverbFilter::~ReverbFilter() {
+    control_->GetCore()->setCaptureTarget(nullptr);
+    if (uiCallback_) uiCallback_->Release();
+    DeleteCriticalSection(&callbackLock_);
     DeleteCriticalSection(&paramLock_);
     control_.reset();
 }
@@ -149,8 +153,11 @@ HRESULT ReverbFilter::CheckTransform(const AM_MEDIA_TYPE* in, const AM_MEDIA_TYP
     const WAVEFORMATEX* fi = WaveFormatOf(in);
     const WAVEFORMATEX* fo = WaveFormatOf(out);
     if (fi == nullptr || fo == nullptr || in->bTemporalCompression || out->bTemporalCompression) return E_INVALIDARG;
-    if (EffectiveFormatTag(in) != EffectiveFormatTag(out) || fi->wBitsPerSample != fo->wBitsPerSample ||
-        fi->nSamplesPerSec != fo->nSamplesPerSec || fo->nChannels != 2)
+    // Equal tags as written (our own offered copy keeps an extensible tag), or the same sample format.
+    const WORD tagIn = EffectiveFormatTag(in);
+    const bool sameTag = fi->wFormatTag == fo->wFormatTag || (tagIn != 0 && tagIn == EffectiveFormatTag(out));
+    if (!sameTag || fi->wBitsPerSample != fo->wBitsPerSample || fi->nSamplesPerSec != fo->nSamplesPerSec ||
+        fo->nChannels != 2)
         return E_INVALIDARG;
     return S_OK;
 }
@@ -161,7 +168,7 @@ HRESULT ReverbFilter::GetMediaType(int position, AM_MEDIA_TYPE* mt) {
     if (in == nullptr || !in->IsConnected()) return E_UNEXPECTED;
     if (position < 0) return E_INVALIDARG;
     if (position > 0) return VFW_S_NO_MORE_ITEMS;
-    return BuildStereoType(&in->MediaType(), mt);
+    return StereoCopyOf(&in->MediaType(), mt);
 }
 
 HRESULT ReverbFilter::CheckInputPinMediaType(const AM_MEDIA_TYPE* mt) {
@@ -171,7 +178,7 @@ HRESULT ReverbFilter::CheckInputPinMediaType(const AM_MEDIA_TYPE* mt) {
     if (out && out->IsConnected() && CheckTransform(mt, &out->MediaType()) != S_OK) {
         // Ask downstream whether it would take the format this input would produce.
         AM_MEDIA_TYPE proposed{};
-        hr = BuildStereoType(mt, &proposed);
+        hr = StereoCopyOf(mt, &proposed);
         if (FAILED(hr)) return hr;
         hr = out->Connected()->QueryAccept(&proposed);
         FreeMediaType(proposed);
@@ -195,13 +202,20 @@ HRESULT ReverbFilter::SetMediaType(PIN_DIRECTION dir, const AM_MEDIA_TYPE* mt) {
     if (f == nullptr) return E_INVALIDARG;
     WAVEFORMATEX& target = dir == PINDIR_INPUT ? inputFormat_ : outputFormat_;
     target.wFormatTag = EffectiveFormatTag(mt);
+    // The output's sample format is the input's: our offered copy of an extensible input keeps its tag
+    // with no extension, which names no sample format of its own.
+    if (dir == PINDIR_OUTPUT && target.wFormatTag == 0) target.wFormatTag = inputFormat_.wFormatTag;
     target.nChannels = f->nChannels;
     target.nSamplesPerSec = f->nSamplesPerSec;
     target.wBitsPerSample = f->wBitsPerSample;
     target.nBlockAlign = static_cast<WORD>(f->wBitsPerSample / 8 * f->nChannels);
     target.nAvgBytesPerSec = target.nSamplesPerSec * target.nBlockAlign;
     target.cbSize = 0;
-    control_->FormatChanged(dir == PINDIR_INPUT ? 0 : 1);
+    if (dir == PINDIR_INPUT) {
+        CritSecLock g(paramLock_);
+        automation_.setSampleRate(target.nSamplesPerSec);
+    }
+    ChangeCore([&] { control_->FormatChanged(dir == PINDIR_INPUT ? 0 : 1); });
     return S_OK;
 }
 
@@ -218,12 +232,29 @@ HRESULT ReverbFilter::DecideBufferSize(IMemAllocator* allocator, ALLOCATOR_PROPE
     if (FAILED(hr)) return hr;
     *request = actual;
     if (actual.cbBuffer < 512) return E_FAIL;
+    ReserveScratch();
     return hr;
 }
 
+void ReverbFilter::ReserveScratch() {
+    // The output allocator copies the input's properties, but each is asked so that a differing
+    // downstream allocator is covered too; a larger sample still works, in pieces.
+    long bytes = 0;
+    ALLOCATOR_PROPERTIES p{};
+    TransformInputPin* in = InputPin();
+    if (in && in->Allocator() && SUCCEEDED(in->Allocator()->GetProperties(&p))) bytes = std::max(bytes, p.cbBuffer);
+    TransformOutputPin* out = OutputPin();
+    if (out && out->Allocator() && SUCCEEDED(out->Allocator()->GetProperties(&p))) bytes = std::max(bytes, p.cbBuffer);
+    const WORD align = std::max<WORD>(1, std::min(inputFormat_.nBlockAlign, outputFormat_.nBlockAlign));
+    if (bytes > 0) control_->ReserveFrames(static_cast<size_t>(bytes) / align);
+}
+
 HRESULT ReverbFilter::StartStreaming() {
+    ReserveScratch();
     streamStarted_ = true;
-    return control_->StartStreaming() ? S_OK : E_OUTOFMEMORY;
+    if (!ChangeCore([&] { return control_->StartStreaming(); })) return E_OUTOFMEMORY;
+    rebuildPending_ = false;  // starting rebuilt the network whole
+    return S_OK;
 }
 
 HRESULT ReverbFilter::StopStreaming() {
@@ -233,65 +264,47 @@ HRESULT ReverbFilter::StopStreaming() {
 
 // ---- streaming ----
 
-void ReverbFilter::ApplyAutomationValue(int32_t id, float value) {
-    ReverbCore* core = control_->GetCore();
-    ParamDesc d;
-    if (!core->getParamDesc(id, d)) return;
-    if (d.automationType == 2 || d.automationType == 3)
-        core->setValue(id, static_cast<int32_t>(value));
-    else
-        core->setNormalized(id, value);
-}
-
-bool ReverbFilter::AutomationActive(int64_t first, int64_t last) {
-    for (const EnvelopeSegment& s : control_->segments) {
-        const bool startInside = s.startSample >= first && s.startSample <= last;
-        const bool endInside = s.endSample >= first && s.endSample <= last;
-        const bool covers = s.startSample <= first && s.endSample >= last;
-        if (startInside || endInside || covers) return true;
-    }
-    return false;
-}
-
 HRESULT ReverbFilter::Receive(IMediaSample* sample) {
     REFERENCE_TIME start = 0, stop = 0;
     const HRESULT timeResult = sample->GetTime(&start, &stop);
     if (FAILED(timeResult)) start = 0;
     const bool timed = timeResult == S_OK;
     blockPosition_ = RefTimeToSamples(start, inputFormat_.nSamplesPerSec);
-    if (streamStarted_) {
-        notifyCounter_ = 0;
-        streamStarted_ = false;
-    }
     BYTE* in = nullptr;
     HRESULT hr = sample->GetPointer(&in);
     if (FAILED(hr)) return hr;
     const long length = sample->GetActualDataLength();
     const int frames = inputFormat_.nBlockAlign ? static_cast<int>(length / inputFormat_.nBlockAlign) : 0;
     const int mode = sample->IsDiscontinuity() == S_OK ? kModeDiscontinuity : kModeOrdinary;
-    return ProcessChunked(in, frames, mode, start, timed, sample);
+    return ProcessChunked(in, frames, mode, timed, sample);
 }
 
-HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, REFERENCE_TIME start,
-                                     bool timed, IMediaSample* source) {
+HRESULT ReverbFilter::RebuildIfPending() {
+    if (!rebuildPending_) return S_OK;
+    // Starting the stream again rebuilds the whole network (it allocates, as a failure is being mended).
+    const HRESULT hr = ComBoundary([&] { return control_->GetCore()->startStreaming() ? S_OK : E_OUTOFMEMORY; });
+    if (SUCCEEDED(hr)) rebuildPending_ = false;
+    return hr;
+}
+
+HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, bool timed, IMediaSample* source) {
+    HRESULT hr = RebuildIfPending();
+    if (FAILED(hr)) return hr;
     const int inAlign = inputFormat_.nBlockAlign;
     const int outAlign = outputFormat_.nBlockAlign;
-    // The automation chunk: 5 ms of input (at least one frame).
-    const int step = std::max<int>(1, static_cast<int>(inputFormat_.nSamplesPerSec / 200));
     bool active;
     {
         CritSecLock g(paramLock_);
-        auto& segs = control_->segments;
-        segs.erase(std::remove_if(segs.begin(), segs.end(),
-                                  [&](const EnvelopeSegment& s) { return s.endSample < blockPosition_; }),
-                   segs.end());
-        active = frames > 0 && AutomationActive(blockPosition_, blockPosition_ + frames - 1);
+        if (streamStarted_) {
+            automation_.restartRefreshCount();
+            streamStarted_ = false;
+        }
+        active = automation_.beginBlock(blockPosition_, frames);
     }
-    REFERENCE_TIME stop = 0;
+    REFERENCE_TIME start = 0, stop = 0;
     source->GetTime(&start, &stop);
     int offset = 0;
     bool first = true;
-    HRESULT hr = S_OK;
     do {
         ComRef<IMediaSample> out;
         if (first) {
@@ -316,30 +329,9 @@ HRESULT ReverbFilter::ProcessChunked(const BYTE* in, int frames, int mode, REFER
         while (offset < frames && filled < capacity) {
             int length = std::min(frames - offset, capacity - filled);
             if (active) {
-                length = std::min(length, step);
-                const int64_t t = blockPosition_ + offset;
-                const int64_t next = std::min<int64_t>(frames - offset - length, step);
                 CritSecLock g(paramLock_);
-                for (const EnvelopeSegment& s : control_->segments) {
-                    if (t < s.startSample || t > s.endSample) continue;
-                    ReverbCore* core = control_->GetCore();
-                    if (t + next > s.endSample) {
-                        ApplyAutomationValue(s.paramId, s.endValue);
-                        core->notifyListeners(s.paramId);
-                    } else if (t == s.startSample) {
-                        ApplyAutomationValue(s.paramId, s.startValue);
-                        core->notifyListeners(s.paramId);
-                    } else {
-                        const double span = static_cast<double>(s.endSample - s.startSample);
-                        const double along = 1.0 - static_cast<double>(s.endSample - t) / span;
-                        ApplyAutomationValue(s.paramId,
-                                             static_cast<float>(s.startValue + along * (s.endValue - s.startValue)));
-                        if (++notifyCounter_ >= kRefreshEveryChunks) {
-                            notifyCounter_ = 0;
-                            core->notifyListeners(s.paramId);
-                        }
-                    }
-                }
+                length = ChangeCore(
+                    [&] { return automation_.applyChunk(blockPosition_ + offset, frames - offset, length, automationSink_); });
             }
             bool shortfall = false;
             const int produced = control_->Process(mode, in + static_cast<size_t>(offset) * inAlign, length,
@@ -363,6 +355,9 @@ HRESULT ReverbFilter::EndOfStream() {
     TransformOutputPin* outPin = OutputPin();
     if (outPin == nullptr || !outPin->IsConnected()) return S_OK;
     const int64_t limit = kMaxDrainSeconds * static_cast<int64_t>(std::max<DWORD>(1, outputFormat_.nSamplesPerSec));
+    const WORD align = outputFormat_.nBlockAlign;
+    HRESULT rebuilt = RebuildIfPending();
+    if (FAILED(rebuilt)) return rebuilt;
     int64_t drained = 0;
     for (;;) {
         ComRef<IMediaSample> out;
@@ -372,26 +367,19 @@ HRESULT ReverbFilter::EndOfStream() {
         BYTE* dst = nullptr;
         hr = out->GetPointer(&dst);
         if (FAILED(hr)) return hr;
-        const int capacity = outputFormat_.nBlockAlign ? static_cast<int>(out->GetSize() / outputFormat_.nBlockAlign) : 0;
+        const int capacity = align ? static_cast<int>(out->GetSize() / align) : 0;
         bool shortfall = false;
         const int produced = control_->Process(kModeDrain, nullptr, 0, dst, capacity, &shortfall);
         drained += produced;
-        if (shortfall || drained >= limit) {
-            HRESULT delivered = S_OK;
-            if (produced > 0) {
-                out->SetActualDataLength(produced * outputFormat_.nBlockAlign);
-                delivered = outPin->Deliver(out.get());
-            }
-            out.reset();
-            const HRESULT eos = outPin->DeliverEndOfStream();
-            return FAILED(delivered) ? delivered : eos;
+        const bool last = shortfall || drained >= limit;
+        if (!last || produced > 0) {
+            out->SetActualDataLength(produced * align);
+            hr = outPin->Deliver(out.get());
         }
-        out->SetActualDataLength(produced * outputFormat_.nBlockAlign);
-        hr = outPin->Deliver(out.get());
         out.reset();
-        if (FAILED(hr)) {
-            outPin->DeliverEndOfStream();
-            return hr;
+        if (last || FAILED(hr)) {
+            const HRESULT eos = outPin->DeliverEndOfStream();
+            return FAILED(hr) ? hr : eos;
         }
     }
 }
@@ -404,48 +392,57 @@ HRESULT ReverbFilter::EndFlush() {
 
 // ---- IPersistStream ----
 
-STDMETHODIMP ReverbFilter::IsDirty() { return control_->IsDirty() ? S_OK : S_FALSE; }
+STDMETHODIMP ReverbFilter::IsDirty() {
+    return ComBoundary([&] { return control_->IsDirty() ? S_OK : S_FALSE; });
+}
 
 STDMETHODIMP ReverbFilter::Load(IStream* stream) {
     if (stream == nullptr) return E_POINTER;
-    BYTE buffer[1024] = {};
-    ULONG got = 0;
-    HRESULT hr = stream->Read(buffer, 20, &got);
-    if (FAILED(hr)) return hr;
-    const uint32_t size = getLe32(buffer);
-    if (size <= 20) return E_UNEXPECTED;
-    uint64_t wanted = size - 20;
-    uint64_t read = 0;
-    if (size <= sizeof buffer) {
-        hr = stream->Read(buffer + 20, static_cast<ULONG>(wanted), &got);
+    return ComBoundary([&]() -> HRESULT {
+        BYTE buffer[1024] = {};
+        ULONG got = 0;
+        HRESULT hr = stream->Read(buffer, 20, &got);
         if (FAILED(hr)) return hr;
-        read = got;
-    } else {
-        // A record larger than ours cannot be valid: consume it in bounded chunks without holding it.
-        BYTE discard[1024];
-        while (read < wanted) {
-            const ULONG n = static_cast<ULONG>(std::min<uint64_t>(sizeof discard, wanted - read));
-            got = 0;
-            hr = stream->Read(discard, n, &got);
+        const uint32_t size = getLe32(buffer);
+        if (size <= 20) return E_UNEXPECTED;
+        const uint64_t wanted = size - 20;
+        uint64_t read = 0;
+        if (size <= sizeof buffer) {
+            hr = stream->Read(buffer + 20, static_cast<ULONG>(wanted), &got);
             if (FAILED(hr)) return hr;
-            if (got == 0) break;  // the stream ended early
-            read += got;
+            read = got;
+        } else {
+            // A record larger than ours cannot be valid: consume it in bounded chunks without holding it.
+            BYTE discard[1024];
+            while (read < wanted) {
+                const ULONG n = static_cast<ULONG>(std::min<uint64_t>(sizeof discard, wanted - read));
+                got = 0;
+                hr = stream->Read(discard, n, &got);
+                if (FAILED(hr)) return hr;
+                if (got == 0) break;  // the stream ended early
+                read += got;
+            }
         }
-    }
-    // A record larger than the buffer is not ours; a short read leaves part of a record unknown. Both are
-    // refused like any other invalid record, without changing a parameter.
-    if (size > sizeof buffer || read < wanted) return E_UNEXPECTED;
-    if (!control_->GetCore()->loadState(buffer, static_cast<int32_t>(size))) return E_UNEXPECTED;
-    control_->RedrawWindows();
-    return hr;
+        // A record larger than the buffer is not ours; a short read leaves part of a record unknown. Both
+        // are refused like any other invalid record, without changing a parameter.
+        if (size > sizeof buffer || read < wanted) return E_UNEXPECTED;
+        if (!ChangeCore([&] { return control_->GetCore()->loadState(buffer, static_cast<int32_t>(size)); }))
+            return E_UNEXPECTED;
+        control_->RedrawWindows();
+        return hr;
+    });
 }
 
-STDMETHODIMP ReverbFilter::Save(IStream* stream, BOOL) {
+STDMETHODIMP ReverbFilter::Save(IStream* stream, BOOL clearDirty) {
     if (stream == nullptr) return E_POINTER;
-    ReverbCore* core = control_->GetCore();
-    std::vector<uint8_t> buffer(core->stateSize());
-    if (!core->saveState(buffer.data())) return E_UNEXPECTED;
-    return stream->Write(buffer.data(), static_cast<ULONG>(buffer.size()), nullptr);
+    return ComBoundary([&]() -> HRESULT {
+        ReverbCore* core = control_->GetCore();
+        uint8_t buffer[kCoreStateSize];
+        if (core->stateSize() != kCoreStateSize || !core->saveState(buffer)) return E_UNEXPECTED;
+        const HRESULT hr = stream->Write(buffer, kCoreStateSize, nullptr);
+        if (SUCCEEDED(hr) && clearDirty) control_->MarkClean(buffer);
+        return hr;
+    });
 }
 
 STDMETHODIMP ReverbFilter::GetSizeMax(ULARGE_INTEGER* size) {
@@ -496,57 +493,61 @@ STDMETHODIMP ReverbFilter::GetParamCount(DWORD* count) {
 STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (info == nullptr) return E_POINTER;
-    CritSecLock g(paramLock_);
-    ReverbCore* core = control_->GetCore();
-    ParamDesc d;
-    if (!core->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
-    std::memset(info, 0, sizeof *info);
-    if (d.automationType == 2) {
-        info->mpType = MPT_BOOL;
-        info->mopCaps = MP_CAPS_CURVE_JUMP;
-        info->mpdMinValue = 0.0f;
-        info->mpdMaxValue = 1.0f;
-        info->mpdNeutralValue = core->getNormalized(d.id);
-    } else if (d.automationType == 3) {
-        info->mpType = MPT_ENUM;
-        info->mopCaps = MP_CAPS_CURVE_JUMP;
-        info->mpdMinValue = static_cast<MP_DATA>(d.minimum);
-        info->mpdMaxValue = static_cast<MP_DATA>(d.maximum);
-        info->mpdNeutralValue = static_cast<MP_DATA>(core->getValue(d.id));
-    } else {
-        info->mpType = MPT_FLOAT;
-        info->mopCaps = MP_CAPS_CURVE_JUMP | MP_CAPS_CURVE_LINEAR;
-        info->mpdMinValue = 0.0f;
-        info->mpdMaxValue = 1.0f;
-        info->mpdNeutralValue = core->getNormalized(d.id);
-    }
-    AnsiToWide(d.name.c_str(), info->szLabel, 32);
-    AnsiToWide((d.automationType == 2 || d.automationType == 3) ? d.label.c_str() : "", info->szUnitText, 32);
-    return S_OK;
+    return ComBoundary([&]() -> HRESULT {
+        CritSecLock g(paramLock_);
+        ReverbCore* core = control_->GetCore();
+        ParamDesc d;
+        if (!Describe(core, index, d)) return E_INVALIDARG;
+        std::memset(info, 0, sizeof *info);
+        if (d.automationType == 2) {
+            info->mpType = MPT_BOOL;
+            info->mopCaps = MP_CAPS_CURVE_JUMP;
+            info->mpdMinValue = 0.0f;
+            info->mpdMaxValue = 1.0f;
+            info->mpdNeutralValue = core->getNormalized(d.id);
+        } else if (d.automationType == 3) {
+            info->mpType = MPT_ENUM;
+            info->mopCaps = MP_CAPS_CURVE_JUMP;
+            info->mpdMinValue = static_cast<MP_DATA>(d.minimum);
+            info->mpdMaxValue = static_cast<MP_DATA>(d.maximum);
+            info->mpdNeutralValue = static_cast<MP_DATA>(core->getValue(d.id));
+        } else {
+            info->mpType = MPT_FLOAT;
+            info->mopCaps = MP_CAPS_CURVE_JUMP | MP_CAPS_CURVE_LINEAR;
+            info->mpdMinValue = 0.0f;
+            info->mpdMaxValue = 1.0f;
+            info->mpdNeutralValue = core->getNormalized(d.id);
+        }
+        AnsiToWide(d.name.c_str(), info->szLabel, 32);
+        AnsiToWide(ShowsUnit(d) ? d.label.c_str() : "", info->szUnitText, 32);
+        return S_OK;
+    });
 }
 
 STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (text == nullptr) return E_POINTER;
-    CritSecLock g(paramLock_);
-    ParamDesc d;
-    if (!control_->GetCore()->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
-    constexpr int kChars = 256;  // a 512-byte block
-    auto* block = static_cast<WCHAR*>(CoTaskMemAlloc(kChars * sizeof(WCHAR)));
-    if (block == nullptr) return E_OUTOFMEMORY;
-    std::memset(block, 0, kChars * sizeof(WCHAR));
-    int at = 0;
-    auto append = [&](const std::string& s) {
-        if (at >= kChars - 1) return;
-        AnsiToWide(s.c_str(), block + at, kChars - 1 - at);
-        at += static_cast<int>(wcslen(block + at)) + 1;
-    };
-    append(d.name);
-    append((d.automationType == 2 || d.automationType == 3) ? d.label : std::string());
-    if (d.automationType == 3)
-        for (const SkinString& n : d.valueNames) append(n);
-    *text = block;
-    return S_OK;
+    return ComBoundary([&]() -> HRESULT {
+        CritSecLock g(paramLock_);
+        ParamDesc d;
+        if (!Describe(control_->GetCore(), index, d)) return E_INVALIDARG;
+        constexpr int kChars = 256;  // a 512-byte block
+        auto* block = static_cast<WCHAR*>(CoTaskMemAlloc(kChars * sizeof(WCHAR)));
+        if (block == nullptr) return E_OUTOFMEMORY;
+        std::memset(block, 0, kChars * sizeof(WCHAR));
+        int at = 0;
+        auto append = [&](const char* s) {
+            if (at >= kChars - 1) return;
+            AnsiToWide(s, block + at, kChars - 1 - at);
+            at += static_cast<int>(wcslen(block + at)) + 1;
+        };
+        append(d.name.c_str());
+        append(ShowsUnit(d) ? d.label.c_str() : "");
+        if (d.automationType == 3)
+            for (const SkinString& n : d.valueNames) append(n.c_str());
+        *text = block;
+        return S_OK;
+    });
 }
 
 STDMETHODIMP ReverbFilter::GetNumTimeFormats(DWORD* count) {
@@ -572,89 +573,94 @@ STDMETHODIMP ReverbFilter::GetCurrentTimeFormat(GUID* format, MP_TIMEDATA* data)
 STDMETHODIMP ReverbFilter::GetParam(DWORD index, MP_DATA* value) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (value == nullptr) return E_POINTER;
-    ReverbCore* core = control_->GetCore();
-    ParamDesc d;
-    if (!core->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
-    *value = (d.automationType == 2 || d.automationType == 3) ? static_cast<MP_DATA>(d.value)
-                                                              : static_cast<MP_DATA>(d.getNormalized());
-    return S_OK;
+    return ComBoundary([&] {
+        *value = automationSink_.read(static_cast<int32_t>(index));
+        return S_OK;
+    });
 }
 
 STDMETHODIMP ReverbFilter::SetParam(DWORD index, MP_DATA value) {
     if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
-    CritSecLock g(paramLock_);
-    const DWORD first = index == kAllParams ? 0 : index;
-    const DWORD last = index == kAllParams ? kMediaParamCount - 1 : index;
-    for (DWORD k = first; k <= last; ++k) {
-        ApplyAutomationValue(static_cast<int32_t>(k), value);
-        control_->GetCore()->notifyListeners(static_cast<int32_t>(k));
-    }
-    return S_OK;
-}
-
-void ReverbFilter::RemoveSegments(int32_t id, int64_t s0, int64_t s1) {
-    auto& segs = control_->segments;
-    segs.erase(std::remove_if(segs.begin(), segs.end(),
-                              [&](const EnvelopeSegment& s) {
-                                  if (s.paramId != id) return false;
-                                  const bool s0In = s0 >= s.startSample && s0 <= s.endSample;
-                                  const bool s1In = s1 >= s.startSample && s1 <= s.endSample;
-                                  const bool inside = s0 < s.startSample && s1 > s.endSample;
-                                  return s0In || s1In || inside;
-                              }),
-               segs.end());
+    return ComBoundary([&] {
+        CritSecLock g(paramLock_);
+        const DWORD first = index == kAllParams ? 0 : index;
+        const DWORD last = index == kAllParams ? kMediaParamCount - 1 : index;
+        for (DWORD k = first; k <= last; ++k) {
+            ChangeCore([&] { automationSink_.apply(static_cast<int32_t>(k), value); });
+            automationSink_.refresh(static_cast<int32_t>(k));
+        }
+        return S_OK;
+    });
 }
 
 STDMETHODIMP ReverbFilter::AddEnvelope(DWORD index, DWORD count, MP_ENVELOPE_SEGMENT* segments) {
     if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
     if (segments == nullptr) return E_POINTER;
-    CritSecLock g(paramLock_);
-    // Times become samples at the input rate: without an input format there is nothing to convert with.
-    const DWORD rate = inputFormat_.nSamplesPerSec;
-    if (rate == 0) return VFW_E_NOT_CONNECTED;
-    if (static_cast<LONG>(count) <= 0) return S_OK;
-    const DWORD first = index == kAllParams ? 0 : index;
-    const DWORD last = index == kAllParams ? kMediaParamCount - 1 : index;
-    for (DWORD k = first; k <= last; ++k) {
+    return ComBoundary([&]() -> HRESULT {
+        CritSecLock g(paramLock_);
+        // Times become samples at the input rate: without an input format there is nothing to convert with.
+        const DWORD rate = inputFormat_.nSamplesPerSec;
+        if (rate == 0) return VFW_E_NOT_CONNECTED;
+        if (static_cast<LONG>(count) <= 0) return S_OK;
+        std::vector<EnvelopeSegment> converted(count);
         for (DWORD i = 0; i < count; ++i) {
             const MP_ENVELOPE_SEGMENT& s = segments[i];
-            EnvelopeSegment e{static_cast<int32_t>(k), RefTimeToSamples(s.rtStart, rate), RefTimeToSamples(s.rtEnd, rate),
-                              s.valStart, s.valEnd, (s.iCurve & 1) != 0};
-            RemoveSegments(e.paramId, e.startSample, e.endSample);
-            control_->segments.push_back(e);
+            converted[i] = EnvelopeSegment{0, RefTimeToSamples(s.rtStart, rate), RefTimeToSamples(s.rtEnd, rate),
+                                           s.valStart, s.valEnd, (s.iCurve & 1) != 0};
         }
-    }
-    return S_OK;
+        const int32_t first = index == kAllParams ? 0 : static_cast<int32_t>(index);
+        const int32_t last = index == kAllParams ? kMediaParamCount - 1 : static_cast<int32_t>(index);
+        automation_.add(first, last, converted.data(), converted.size());
+        return S_OK;
+    });
 }
 
 STDMETHODIMP ReverbFilter::FlushEnvelope(DWORD index, REFERENCE_TIME start, REFERENCE_TIME stop) {
-    if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
-    CritSecLock g(paramLock_);
-    const DWORD rate = inputFormat_.nSamplesPerSec;
-    if (rate == 0) return S_OK;
-    const int64_t s0 = RefTimeToSamples(start, rate), s1 = RefTimeToSamples(stop, rate);
-    const DWORD first = index == kAllParams ? 0 : index;
-    const DWORD last = index == kAllParams ? kMediaParamCount - 1 : index;
-    for (DWORD k = first; k <= last; ++k) RemoveSegments(static_cast<int32_t>(k), s0, s1);
-    return S_OK;
+    return ComBoundary([&]() -> HRESULT {
+        CritSecLock g(paramLock_);
+        const DWORD rate = inputFormat_.nSamplesPerSec;
+        if (rate == 0) return S_OK;  // no segment can exist yet
+        if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
+        const int32_t first = index == kAllParams ? 0 : static_cast<int32_t>(index);
+        const int32_t last = index == kAllParams ? kMediaParamCount - 1 : static_cast<int32_t>(index);
+        automation_.remove(first, last, RefTimeToSamples(start, rate), RefTimeToSamples(stop, rate));
+        return S_OK;
+    });
 }
 
 STDMETHODIMP ReverbFilter::SetTimeFormat(GUID, MP_TIMEDATA) { return S_OK; }
 
 STDMETHODIMP ReverbFilter::SetCaptureCallback(ICaptureCallback* callback) {
-    uiCallback_ = callback;
-    control_->GetCore()->setCaptureTarget(this);
-    return S_OK;
+    return ComBoundary([&] {
+        if (callback) callback->AddRef();
+        ICaptureCallback* old;
+        {
+            CritSecLock g(callbackLock_);
+            old = uiCallback_;
+            uiCallback_ = callback;
+        }
+        if (old) old->Release();
+        control_->GetCore()->setCaptureTarget(this);
+        return S_OK;
+    });
 }
 
 void ReverbFilter::captureParameter(int32_t id, float) {
-    if (uiCallback_ == nullptr || id < 0 || id >= static_cast<int32_t>(kMediaParamCount)) return;
+    if (id < 0 || id >= static_cast<int32_t>(kMediaParamCount)) return;
+    ICaptureCallback* callback;
+    {
+        CritSecLock g(callbackLock_);
+        callback = uiCallback_;
+        if (callback) callback->AddRef();
+    }
+    if (callback == nullptr) return;
     DWORD k = static_cast<DWORD>(id);  // media-parameter index k is parameter id k
     MP_DATA value = 0;
     GetParam(k, &value);
-    uiCallback_->BeginCapture(&k, 1);
-    uiCallback_->Changed(&k, 1, &value);
-    uiCallback_->EndCapture(&k, 1);
+    callback->BeginCapture(&k, 1);
+    callback->Changed(&k, 1, &value);
+    callback->EndCapture(&k, 1);
+    callback->Release();
 }
 
 }  // namespace dshow

@@ -1,17 +1,22 @@
 // ReverbFilter: the DirectShow audio transform that runs stereo 16-bit PCM or 32-bit float through the
-// reverb into separate output buffers, applies media-parameter automation in 5 ms chunks and drains the
-// reverb tail at end of stream. It also answers IPersistStream (the 88-byte settings record),
-// ISpecifyPropertyPages, IHostPresets, the media-parameter interfaces and the capture-callback setter.
+// reverb into separate output buffers, plays media-parameter envelopes (converted to samples and handed
+// to Automation) and drains the reverb tail at end of stream. It also answers IPersistStream (the
+// 88-byte settings record), ISpecifyPropertyPages, IHostPresets, the media-parameter interfaces and the
+// capture-callback setter.
 //
 // Threads: Receive and EndOfStream run on the upstream streaming thread; format, state and automation
-// calls on the graph's thread; the editor on its window thread. paramLock_ guards the automation segments
-// and is always taken before the core's lock, never while holding it.
+// calls on the graph's thread; the editor on its window thread. paramLock_ guards the automation and is
+// always taken before the core's lock, never while holding it. callbackLock_ guards only the capture
+// callback pointer; the host's callback is called with neither lock held.
 #pragma once
 
 #include <windows.h>
 #include <dshow.h>
 #include <medparam.h>
 
+#include <atomic>
+
+#include "filter/Automation.h"
 #include "filter/ReverbCore.h"
 #include "filter/dshow/Interfaces.h"
 #include "filter/dshow/ReverbControl.h"
@@ -35,7 +40,7 @@ public:
     // Creates a filter for the class factory; *hr receives the failure when null is returned.
     static IUnknown* CreateInstance(IUnknown* outer, HRESULT* hr);
 
-    ReverbFilter(IUnknown* outer, HRESULT* hr);
+    explicit ReverbFilter(IUnknown* outer);
     ~ReverbFilter() override;
 
     STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override { return outer_->QueryInterface(riid, ppv); }
@@ -90,26 +95,41 @@ public:
 
     ReverbControl& Control() { return *control_; }
     const WAVEFORMATEX& InputFormat() const { return inputFormat_; }
+    // The envelopes; read them only while no other thread uses the filter.
+    const Automation& AutomationForInspection() const { return automation_; }
 
 private:
     void captureParameter(int32_t id, float position) override;
-    // Removes the segments of one parameter that intersect [s0, s1]. Called under paramLock_.
-    void RemoveSegments(int32_t id, int64_t s0, int64_t s1);
-    // Sets one parameter from an automation or SetParam value.
-    void ApplyAutomationValue(int32_t id, float value);
-    bool AutomationActive(int64_t first, int64_t last);
+    // Sizes the conversion scratch for the larger of the two allocators' buffers.
+    void ReserveScratch();
+    // Runs a change of the core's settings. An exception from it (out of memory while the engine
+    // rebuilds its network) may leave the engine half built, so the engine is rebuilt whole before the
+    // next block is processed.
+    template <class Change>
+    auto ChangeCore(Change&& change) -> decltype(change()) {
+        try {
+            return change();
+        } catch (...) {
+            rebuildPending_ = true;
+            throw;
+        }
+    }
+    // Rebuilds the engine after a failed change; E_OUTOFMEMORY while that is still impossible.
+    HRESULT RebuildIfPending();
     // Runs an input block through the core into as many output samples as it needs.
-    HRESULT ProcessChunked(const BYTE* in, int frames, int mode, REFERENCE_TIME start, bool timed,
-                           IMediaSample* source);
+    HRESULT ProcessChunked(const BYTE* in, int frames, int mode, bool timed, IMediaSample* source);
 
     std::unique_ptr<ReverbControl> control_;
     CRITICAL_SECTION paramLock_;
-    ICaptureCallback* uiCallback_ = nullptr;  // not referenced: the host keeps it alive while set
+    Automation automation_;             // guarded by paramLock_
+    CoreAutomationSink automationSink_;  // applies envelope and SetParam values to the core
+    CRITICAL_SECTION callbackLock_;
+    ICaptureCallback* uiCallback_ = nullptr;  // referenced; guarded by callbackLock_
     WAVEFORMATEX inputFormat_{};
     WAVEFORMATEX outputFormat_{};
     bool streamStarted_ = false;
+    std::atomic<bool> rebuildPending_{false};
     int64_t blockPosition_ = 0;
-    int32_t notifyCounter_ = 0;
 };
 
 // The effective sample format of a wave format: WAVE_FORMAT_PCM or WAVE_FORMAT_IEEE_FLOAT for a plain or

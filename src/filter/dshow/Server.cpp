@@ -1,42 +1,25 @@
-// The in-process COM server: class table, class factory, object and lock counting, the four exports and
-// registration (server keys under HKEY_CLASSES_ROOT and the filter-mapper record).
+// The in-process COM server: DLL entry point, class factory, object and lock counting and the four
+// exports. What is registered, and how, lives in Registration.cpp beside the class table.
+//
+// Threads: the exports may be called on any thread; the factory keeps no state but its entry, and the
+// counts are atomic. Every export and factory method runs its body through ComBoundary.
 #include <windows.h>
 #include <dshow.h>
-#include <olectl.h>
 
-#include <cwchar>
 #include <new>
 
 #include "filter/dshow/DShowUtil.h"
-#include "filter/dshow/Interfaces.h"
-#include "filter/dshow/ReverbFilter.h"
+#include "filter/dshow/Registration.h"
 
 namespace ulvetta {
 namespace dshow {
 
 namespace {
 
+HMODULE g_module = nullptr;
+std::atomic<long> g_lockCount{0};
 // The editor's process-wide lock (its keyboard hook and mouse handling take it).
 CRITICAL_SECTION* g_editorLock = nullptr;
-
-using CreateFunction = IUnknown* (*)(IUnknown* outer, HRESULT* hr);
-
-IUnknown* CreatePropertyPage(IUnknown*, HRESULT* hr) {
-    // The property page arrives with the editor.
-    *hr = CLASS_E_CLASSNOTAVAILABLE;
-    return nullptr;
-}
-
-struct ClassEntry {
-    const wchar_t* name;
-    const CLSID* clsid;
-    CreateFunction create;
-};
-
-const ClassEntry kClasses[] = {
-    {L"Morvane Ulvetta", &CLSID_UlvettaFilter, &ReverbFilter::CreateInstance},
-    {L"Morvane Ulvetta Property Page", &CLSID_UlvettaPropertyPage, &CreatePropertyPage},
-};
 
 class ClassFactory : public SingleInterfaceObject<IClassFactory> {
 public:
@@ -46,13 +29,15 @@ public:
         *ppv = nullptr;
         // An aggregating outer object may only ask for the inner IUnknown.
         if (outer != nullptr && riid != IID_IUnknown) return E_NOINTERFACE;
-        HRESULT hr = S_OK;
-        IUnknown* inner = entry_.create(outer, &hr);
-        if (inner == nullptr) return FAILED(hr) ? hr : E_OUTOFMEMORY;
-        inner->AddRef();
-        hr = inner->QueryInterface(riid, ppv);
-        inner->Release();
-        return hr;
+        return ComBoundary([&] {
+            HRESULT hr = S_OK;
+            IUnknown* inner = entry_.create(outer, &hr);
+            if (inner == nullptr) return FAILED(hr) ? hr : E_OUTOFMEMORY;
+            inner->AddRef();
+            hr = inner->QueryInterface(riid, ppv);
+            inner->Release();
+            return hr;
+        });
     }
     STDMETHODIMP LockServer(BOOL lock) override {
         if (lock)
@@ -64,72 +49,6 @@ public:
 
 private:
     const ClassEntry& entry_;
-};
-
-void GuidText(const CLSID& clsid, wchar_t* out, int capacity) { StringFromGUID2(clsid, out, capacity); }
-
-LONG SetStringValue(HKEY key, const wchar_t* name, const wchar_t* value) {
-    return RegSetValueExW(key, name, 0, REG_SZ, reinterpret_cast<const BYTE*>(value),
-                          static_cast<DWORD>((wcslen(value) + 1) * sizeof(wchar_t)));
-}
-
-HRESULT WriteServerKeys(const ClassEntry& e, const wchar_t* modulePath) {
-    wchar_t guid[64], path[128];
-    GuidText(*e.clsid, guid, 64);
-    swprintf(path, 128, L"CLSID\\%ls", guid);
-    HKEY clsidKey = nullptr, serverKey = nullptr;
-    LONG r = RegCreateKeyExW(HKEY_CLASSES_ROOT, path, 0, nullptr, 0, KEY_WRITE, nullptr, &clsidKey, nullptr);
-    if (r != ERROR_SUCCESS) return HRESULT_FROM_WIN32(r);
-    r = SetStringValue(clsidKey, nullptr, e.name);
-    if (r == ERROR_SUCCESS)
-        r = RegCreateKeyExW(clsidKey, L"InprocServer32", 0, nullptr, 0, KEY_WRITE, nullptr, &serverKey, nullptr);
-    if (r == ERROR_SUCCESS) {
-        r = SetStringValue(serverKey, nullptr, modulePath);
-        if (r == ERROR_SUCCESS) r = SetStringValue(serverKey, L"ThreadingModel", L"Both");
-        RegCloseKey(serverKey);
-    }
-    RegCloseKey(clsidKey);
-    return r == ERROR_SUCCESS ? S_OK : HRESULT_FROM_WIN32(r);
-}
-
-HRESULT RemoveServerKeys(const ClassEntry& e) {
-    wchar_t guid[64], path[128];
-    GuidText(*e.clsid, guid, 64);
-    swprintf(path, 128, L"CLSID\\%ls", guid);
-    // The whole class key: the server keys and anything registered below them.
-    const LONG r = RegDeleteTreeW(HKEY_CLASSES_ROOT, path);
-    return (r == ERROR_SUCCESS || r == ERROR_FILE_NOT_FOUND) ? S_OK : HRESULT_FROM_WIN32(r);
-}
-
-// The class's IAMovieSetup, created in process; classes without one count as done.
-HRESULT WithSetup(const ClassEntry& e, bool registering) {
-    HRESULT hr = S_OK;
-    IUnknown* inner = e.create(nullptr, &hr);
-    if (inner == nullptr) {
-        // A class that cannot be created here has no filter-mapper record to write.
-        return (hr == E_NOINTERFACE || hr == VFW_E_NEED_OWNER || hr == CLASS_E_CLASSNOTAVAILABLE) ? S_OK : hr;
-    }
-    inner->AddRef();
-    ComRef<IAMovieSetup> setup;
-    hr = inner->QueryInterface(IID_IAMovieSetup, reinterpret_cast<void**>(setup.put()));
-    inner->Release();
-    if (hr == E_NOINTERFACE) return S_OK;
-    if (FAILED(hr)) return hr;
-    hr = setup->Unregister();
-    if (registering && SUCCEEDED(hr)) hr = setup->Register();
-    return hr;
-}
-
-// COM for the registration calls, when the caller has not started it on this thread.
-class ComScope {
-public:
-    ComScope() : hr_(CoInitializeEx(nullptr, COINIT_APARTMENTTHREADED)) {}
-    ~ComScope() {
-        if (SUCCEEDED(hr_)) CoUninitialize();
-    }
-
-private:
-    HRESULT hr_;
 };
 
 }  // namespace
@@ -161,41 +80,25 @@ BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID) {
 STDAPI DllGetClassObject(REFCLSID clsid, REFIID riid, void** ppv) {
     if (ppv == nullptr) return E_POINTER;
     *ppv = nullptr;
-    for (const ClassEntry& e : kClasses) {
-        if (*e.clsid != clsid) continue;
-        auto* factory = new (std::nothrow) ClassFactory(e);
-        if (factory == nullptr) return E_OUTOFMEMORY;
+    const ClassEntry* e = FindClass(clsid);
+    if (e == nullptr) return CLASS_E_CLASSNOTAVAILABLE;
+    return ComBoundary([&] {
+        auto* factory = new ClassFactory(*e);
         factory->AddRef();
         HRESULT hr = factory->QueryInterface(riid, ppv);
         factory->Release();
         return hr;
-    }
-    return CLASS_E_CLASSNOTAVAILABLE;
+    });
 }
 
 STDAPI DllCanUnloadNow() { return (g_objectCount == 0 && g_lockCount == 0) ? S_OK : S_FALSE; }
 
 STDAPI DllRegisterServer() {
-    wchar_t path[MAX_PATH];
-    const DWORD n = GetModuleFileNameW(g_module, path, MAX_PATH);
-    if (n == 0 || n >= MAX_PATH) return HRESULT_FROM_WIN32(GetLastError());
-    ComScope com;
-    for (const ClassEntry& e : kClasses) {
-        HRESULT hr = WriteServerKeys(e, path);
-        if (SUCCEEDED(hr)) hr = WithSetup(e, true);
-        if (FAILED(hr)) return hr;
-    }
-    return S_OK;
+    return ComBoundary([] { return RegisterServer(g_module); });
 }
 
 STDAPI DllUnregisterServer() {
-    ComScope com;
-    for (int i = static_cast<int>(sizeof kClasses / sizeof kClasses[0]) - 1; i >= 0; --i) {
-        HRESULT hr = WithSetup(kClasses[i], false);
-        if (SUCCEEDED(hr)) hr = RemoveServerKeys(kClasses[i]);
-        if (FAILED(hr)) return hr;
-    }
-    return S_OK;
+    return ComBoundary([] { return UnregisterServer(); });
 }
 
 }  // extern "C"

@@ -5,8 +5,11 @@
 //
 // Threads and locks: stateLock_ guards the filter state and connections (graph thread); receiveLock_ is
 // held while a sample or end of stream is processed (streaming thread), and Stop takes it after
-// decommitting the input allocator so that a blocked streaming thread is released first. No lock is
-// held while calling downstream from a state change; BeginFlush takes no lock.
+// decommitting the input allocator so that a blocked streaming thread is released first. A state change
+// holds no lock while it calls downstream (Pause and Run deliver the end of stream of an unconnected
+// input after releasing the state lock). BeginFlush takes no lock; EndFlush holds the state lock while
+// it passes the flush on, so downstream must not change the filter's state from its EndFlush. Every COM
+// method that can fail by an exception runs its body through ComBoundary.
 //
 // The reference count of the pins is the filter's. A derived filter supplies the format checks, buffer
 // sizing and the processing of samples.
@@ -15,156 +18,15 @@
 #include <windows.h>
 #include <dshow.h>
 
+#include <atomic>
 #include <memory>
 
 #include "filter/dshow/DShowUtil.h"
+#include "filter/dshow/TransformInputPin.h"
+#include "filter/dshow/TransformOutputPin.h"
 
 namespace ulvetta {
 namespace dshow {
-
-class TransformFilter;
-
-// Common part of both pins: connection, media type and the IPin queries.
-class TransformPin : public IPin {
-public:
-    TransformPin(TransformFilter* filter, PIN_DIRECTION dir, const wchar_t* name, const wchar_t* id);
-    virtual ~TransformPin();
-
-    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override;
-    STDMETHODIMP_(ULONG) AddRef() override;
-    STDMETHODIMP_(ULONG) Release() override;
-
-    STDMETHODIMP Disconnect() override;
-    STDMETHODIMP ConnectedTo(IPin** pin) override;
-    STDMETHODIMP ConnectionMediaType(AM_MEDIA_TYPE* mt) override;
-    STDMETHODIMP QueryPinInfo(PIN_INFO* info) override;
-    STDMETHODIMP QueryDirection(PIN_DIRECTION* dir) override;
-    STDMETHODIMP QueryId(LPWSTR* id) override;
-    STDMETHODIMP QueryAccept(const AM_MEDIA_TYPE* mt) override;
-    STDMETHODIMP EnumMediaTypes(IEnumMediaTypes** e) override;
-    STDMETHODIMP QueryInternalConnections(IPin** pins, ULONG* n) override;
-
-    bool IsConnected() const { return connected_.get() != nullptr; }
-    IPin* Connected() const { return connected_.get(); }
-    const AM_MEDIA_TYPE& MediaType() const { return mt_; }
-    // The pin's own media-type check.
-    virtual HRESULT CheckMediaType(const AM_MEDIA_TYPE* mt) = 0;
-    // Type offered at a position of this pin's enumeration.
-    virtual HRESULT GetMediaType(int position, AM_MEDIA_TYPE* mt) = 0;
-
-protected:
-    // Stores a new connection; called under the filter's state lock.
-    void SetConnection(IPin* pin, const AM_MEDIA_TYPE* mt);
-    void ClearConnection();
-
-    TransformFilter* filter_;
-    PIN_DIRECTION dir_;
-    const wchar_t* name_;
-    const wchar_t* id_;
-    ComRef<IPin> connected_;
-    AM_MEDIA_TYPE mt_{};
-};
-
-class TransformInputPin : public TransformPin, public IMemInputPin {
-public:
-    explicit TransformInputPin(TransformFilter* filter);
-    ~TransformInputPin() override;
-
-    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override;
-    STDMETHODIMP_(ULONG) AddRef() override { return TransformPin::AddRef(); }
-    STDMETHODIMP_(ULONG) Release() override { return TransformPin::Release(); }
-
-    // IPin
-    STDMETHODIMP Connect(IPin* receivePin, const AM_MEDIA_TYPE* mt) override;
-    STDMETHODIMP ReceiveConnection(IPin* connector, const AM_MEDIA_TYPE* mt) override;
-    STDMETHODIMP Disconnect() override;
-    STDMETHODIMP EndOfStream() override;
-    STDMETHODIMP BeginFlush() override;
-    STDMETHODIMP EndFlush() override;
-    STDMETHODIMP NewSegment(REFERENCE_TIME start, REFERENCE_TIME stop, double rate) override;
-
-    // IMemInputPin
-    STDMETHODIMP GetAllocator(IMemAllocator** allocator) override;
-    STDMETHODIMP NotifyAllocator(IMemAllocator* allocator, BOOL readOnly) override;
-    STDMETHODIMP GetAllocatorRequirements(ALLOCATOR_PROPERTIES* props) override;
-    STDMETHODIMP Receive(IMediaSample* sample) override;
-    STDMETHODIMP ReceiveMultiple(IMediaSample** samples, long count, long* processed) override;
-    STDMETHODIMP ReceiveCanBlock() override;
-
-    HRESULT CheckMediaType(const AM_MEDIA_TYPE* mt) override;
-    HRESULT GetMediaType(int, AM_MEDIA_TYPE*) override { return VFW_S_NO_MORE_ITEMS; }
-
-    IMemAllocator* Allocator() const { return allocator_.get(); }
-    bool Flushing() const { return flushing_; }
-    // Decommits the allocator (releases a streaming thread blocked in GetBuffer).
-    void Inactive();
-    void Active() { endOfStream_ = false; }
-
-private:
-    ComRef<IMemAllocator> allocator_;
-    std::atomic<bool> flushing_{false};
-    bool endOfStream_ = false;
-};
-
-class TransformOutputPin : public TransformPin, public IMediaSeeking {
-public:
-    explicit TransformOutputPin(TransformFilter* filter);
-    ~TransformOutputPin() override;
-
-    STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override;
-    STDMETHODIMP_(ULONG) AddRef() override { return TransformPin::AddRef(); }
-    STDMETHODIMP_(ULONG) Release() override { return TransformPin::Release(); }
-
-    // IPin
-    STDMETHODIMP Connect(IPin* receivePin, const AM_MEDIA_TYPE* mt) override;
-    STDMETHODIMP ReceiveConnection(IPin*, const AM_MEDIA_TYPE*) override { return E_UNEXPECTED; }
-    STDMETHODIMP Disconnect() override;
-    STDMETHODIMP EndOfStream() override { return E_UNEXPECTED; }
-    STDMETHODIMP BeginFlush() override { return E_UNEXPECTED; }
-    STDMETHODIMP EndFlush() override { return E_UNEXPECTED; }
-    STDMETHODIMP NewSegment(REFERENCE_TIME, REFERENCE_TIME, double) override { return S_OK; }
-
-    // IMediaSeeking, forwarded to the pin upstream of the filter's input.
-    STDMETHODIMP GetCapabilities(DWORD* caps) override;
-    STDMETHODIMP CheckCapabilities(DWORD* caps) override;
-    STDMETHODIMP IsFormatSupported(const GUID* format) override;
-    STDMETHODIMP QueryPreferredFormat(GUID* format) override;
-    STDMETHODIMP GetTimeFormat(GUID* format) override;
-    STDMETHODIMP IsUsingTimeFormat(const GUID* format) override;
-    STDMETHODIMP SetTimeFormat(const GUID* format) override;
-    STDMETHODIMP GetDuration(LONGLONG* duration) override;
-    STDMETHODIMP GetStopPosition(LONGLONG* stop) override;
-    STDMETHODIMP GetCurrentPosition(LONGLONG* current) override;
-    STDMETHODIMP ConvertTimeFormat(LONGLONG* target, const GUID* targetFormat, LONGLONG source,
-                                   const GUID* sourceFormat) override;
-    STDMETHODIMP SetPositions(LONGLONG* current, DWORD currentFlags, LONGLONG* stop, DWORD stopFlags) override;
-    STDMETHODIMP GetPositions(LONGLONG* current, LONGLONG* stop) override;
-    STDMETHODIMP GetAvailable(LONGLONG* earliest, LONGLONG* latest) override;
-    STDMETHODIMP SetRate(double rate) override;
-    STDMETHODIMP GetRate(double* rate) override;
-    STDMETHODIMP GetPreroll(LONGLONG* preroll) override;
-
-    HRESULT CheckMediaType(const AM_MEDIA_TYPE* mt) override;
-    HRESULT GetMediaType(int position, AM_MEDIA_TYPE* mt) override;
-
-    HRESULT GetDeliveryBuffer(IMediaSample** sample, REFERENCE_TIME* start, REFERENCE_TIME* stop, DWORD flags);
-    HRESULT Deliver(IMediaSample* sample);
-    HRESULT DeliverEndOfStream();
-    HRESULT DeliverBeginFlush();
-    HRESULT DeliverEndFlush();
-    HRESULT DeliverNewSegment(REFERENCE_TIME start, REFERENCE_TIME stop, double rate);
-    HRESULT Active();
-    void Inactive();
-
-private:
-    HRESULT TryConnect(IPin* receivePin, const AM_MEDIA_TYPE* mt);
-    HRESULT DecideAllocator(IMemInputPin* input);
-    // The upstream seeking interface, or null.
-    HRESULT UpstreamSeeking(IMediaSeeking** seeking);
-
-    ComRef<IMemInputPin> input_;
-    ComRef<IMemAllocator> allocator_;
-};
 
 // Non-delegating unknown of an aggregatable object.
 struct INonDelegatingUnknown {
@@ -242,6 +104,10 @@ public:
     CRITICAL_SECTION& ReceiveLock() { return receiveLock_; }
 
 protected:
+    // Moves to Paused under the state lock; the pin that must be told the stream has ended (an
+    // unconnected input) is returned for the caller to notify after releasing the lock.
+    HRESULT PauseLocked(ComRef<IPin>& endOfStreamTo);
+
     struct Inner : IUnknown {
         TransformFilter* owner;
         STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
@@ -259,7 +125,6 @@ protected:
     CRITICAL_SECTION receiveLock_;
     FILTER_STATE state_ = State_Stopped;
     IReferenceClock* clock_ = nullptr;
-    REFERENCE_TIME start_ = 0;
     IFilterGraph* graph_ = nullptr;  // not referenced: the graph owns the filter
     wchar_t name_[MAX_FILTER_NAME] = {};
     bool eosDelivered_ = false;
