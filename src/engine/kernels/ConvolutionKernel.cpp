@@ -6,7 +6,7 @@
 #include <cmath>
 
 #include "engine/ReverbEngine.h"
-#include "processing/BlockFrame.h"
+#include "engine/kernels/BlockFrame.h"
 
 namespace ulvetta {
 

@@ -1,7 +1,7 @@
 // The twenty-line plates (modes 2 and 6): the plate tank with combs and plain delays hung off both halves,
 // read through six more taps per side for a denser echo. Mode 2 sums all taps with weight 1; mode 6 weights
 // them for a swelling, "reversed" envelope. Runs on the streaming thread under the core's lock.
-#include "processing/PlateNetwork.h"
+#include "engine/kernels/PlateNetwork.h"
 
 namespace ulvetta {
 

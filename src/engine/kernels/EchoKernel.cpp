@@ -4,7 +4,7 @@
 // the streaming thread under the core's lock.
 #include <cmath>
 
-#include "processing/PlateNetwork.h"
+#include "engine/kernels/PlateNetwork.h"
 
 namespace ulvetta {
 

@@ -6,7 +6,7 @@
 #include <cmath>
 #include <cstring>
 
-#include "processing/BlockFrame.h"
+#include "engine/kernels/BlockFrame.h"
 
 namespace ulvetta {
 

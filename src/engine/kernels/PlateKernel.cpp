@@ -2,7 +2,7 @@
 // coloured, pre-delayed and diffused mono input, with seven output taps per side plus an early-reflection
 // path per side. Runs on the streaming thread under the core's lock; allocation-free.
 #include "engine/NetworkTables.h"
-#include "processing/PlateNetwork.h"
+#include "engine/kernels/PlateNetwork.h"
 
 namespace ulvetta {
 
