@@ -11,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "engine/EngineProbe.h"
 #include "filter/CoreState.h"
 #include "filter/dshow/ReverbFilter.h"
 
@@ -160,8 +161,8 @@ TEST(FilterFormats, SetMediaTypeNormalisesAndReachesTheCore) {
     EXPECT_EQ(w.nAvgBytesPerSec, 768000u);
     EXPECT_EQ(w.cbSize, 0);
     ReverbCore* core = f.filter->Control().GetCore();
-    EXPECT_EQ(core->engineForInspection().sampleRate, 96000);
-    EXPECT_EQ(core->engineForInspection().mode, 2);  // every parameter was applied
+    EXPECT_EQ(EngineProbe(core->engineForInspection()).sampleRate(), 96000);
+    EXPECT_EQ(EngineProbe(core->engineForInspection()).mode(), 2);  // every parameter was applied
     WAVEFORMATEX got{};
     EXPECT_EQ(f.filter->Control().GetFormat(&got, 0), S_OK);
     EXPECT_EQ(got.nSamplesPerSec, 96000u);
