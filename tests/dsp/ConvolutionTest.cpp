@@ -1,6 +1,6 @@
 // The convolution reverbs: the prepared response against the stored one (shortening, fade, damping, room
-// envelope, rate conversion), the kernel against a direct convolution, workers against inline jobs, the
-// exact tail, settings changed while another thread streams, and repeated preparation.
+// envelope, rate conversion), the core's copy of it, the kernel against a direct convolution, workers
+// against inline jobs, the exact tail, settings changed while another thread streams, repeated preparation.
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -76,9 +76,8 @@ TEST(ImpulsePreparation, DampingAndRoomEnvelope) {
     for (int i = 0; i < p.responseLength(); ++i) ASSERT_LT(std::fabs(p.responseLeft()[i]), 1.0f) << i;
 }
 
-// At 48 kHz the response is about 48000 / 44100 times as long (its stored trailing zeros stay zeros), and
-// preparing it again gives the same spectra.
-TEST(ImpulsePreparation, ConvertsToTheStreamRateAndRepeatsExactly) {
+// At 48 kHz the response is about 48000 / 44100 times as long (its stored trailing zeros stay zeros).
+TEST(ImpulsePreparation, ConvertsToTheStreamRate) {
     ReverbEngine e;
     StartConvolution(e, 48000, 4);
     const EngineProbe p(e);
@@ -86,30 +85,6 @@ TEST(ImpulsePreparation, ConvertsToTheStreamRateAndRepeatsExactly) {
     for (int i = 0; i < p.responseLength(); ++i)
         if (p.responseLeft()[i] != 0.0f) last = i;
     EXPECT_NEAR(last, 147120 - 5888 * 48000 / 44100, 80);
-    const ConvPartition& part = p.partition(10);
-    const std::vector<float> spectrum(part.spectrumLeft.get(), part.spectrumLeft.get() + 2 * part.size);
-    e.SetDecay(100);  // prepares again
-    ASSERT_TRUE(std::equal(spectrum.begin(), spectrum.end(), p.partition(10).spectrumLeft.get()));
-}
-
-// A left impulse at frame 100 returns the left response (at the wet level) from frame 100 on, and the right
-// channel stays silent.
-TEST(ConvolutionKernel, ImpulseReturnsTheResponseFromItsOwnFrame) {
-    for (int rate : {22050, 44100, 96000}) {
-        ReverbEngine e;
-        StartConvolution(e, rate, 3, 30);
-        e.SetWetLevel(0.5);
-        const EngineProbe p(e);
-        const int length = p.responseLength();
-        std::vector<float> in(2 * (length + 1000), 0.0f);
-        in[2 * 100] = 1.0f;
-        const std::vector<float> out = test::Render(e, in);
-        for (int i = 0; i < length + 1000; ++i) {
-            const double expected = i < 100 || i >= 100 + length ? 0.0 : 0.5 * p.responseLeft()[i - 100];
-            ASSERT_NEAR(out[2 * i], expected, 2e-6) << rate << " at " << i;
-            ASSERT_EQ(out[2 * i + 1], 0.0f) << rate << " at " << i;
-        }
-    }
 }
 
 // The core copies out the response its engine prepared, and nothing for a delay-network algorithm.
@@ -128,21 +103,28 @@ TEST(ConvolutionKernel, CoreHandsOutThePreparedResponse) {
     EXPECT_TRUE(std::equal(right.begin(), right.end(), p.responseRight()));
 }
 
-TEST(ConvolutionKernel, MatchesDirectConvolutionAcrossBlockSizes) {
-    ReverbEngine e;
-    StartConvolution(e, 44100, 5, 0);
-    const EngineProbe p(e);
-    const std::vector<float> in = test::Noise(9000, 0.5f, 7);
-    for (int block : {1, 333, 4096}) {
-        e.ResetState();
-        const std::vector<float> out = test::Render(e, in, block);
-        for (int n = 0; n < 9000; n += 37) {
-            double expected = 0.0, scale = 0.0;
-            for (int k = 0; k < p.responseLength() && k <= n; ++k) {
-                expected += double(p.responseLeft()[k]) * in[2 * (n - k)];
-                scale += std::fabs(double(p.responseLeft()[k]) * in[2 * (n - k)]);
+// Left-only noise gives a direct convolution with the left response, at the wet level, whatever the block
+// size and the rate; the right channel stays silent.
+TEST(ConvolutionKernel, MatchesDirectConvolutionAcrossBlockSizesAndRates) {
+    for (int rate : {22050, 44100, 96000}) {
+        ReverbEngine e;
+        StartConvolution(e, rate, 5, 0);
+        e.SetWetLevel(0.5);
+        const EngineProbe p(e);
+        std::vector<float> in = test::Noise(9000, 0.5f, 7);
+        for (size_t i = 1; i < in.size(); i += 2) in[i] = 0.0f;
+        for (int block : {1, 333, 4096}) {
+            e.ResetState();
+            const std::vector<float> out = test::Render(e, in, block);
+            for (int n = 0; n < 9000; n += 37) {
+                double expected = 0.0, scale = 0.0;
+                for (int k = 0; k < p.responseLength() && k <= n; ++k) {
+                    expected += 0.5 * p.responseLeft()[k] * in[2 * (n - k)];
+                    scale += std::fabs(0.5 * p.responseLeft()[k] * in[2 * (n - k)]);
+                }
+                ASSERT_NEAR(out[2 * n], expected, 1e-5 * scale + 1e-7) << rate << " block " << block << " at " << n;
+                ASSERT_EQ(out[2 * n + 1], 0.0f) << rate << " block " << block << " at " << n;
             }
-            ASSERT_NEAR(out[2 * n], expected, 1e-5 * scale + 1e-7) << "block " << block << " frame " << n;
         }
     }
 }

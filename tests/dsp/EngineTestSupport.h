@@ -50,6 +50,11 @@ inline void Start(ReverbEngine& e, int rate, const Settings& s) {
     e.ResetState();
 }
 
+// An engine started with the given settings.
+struct Started : ReverbEngine {
+    Started(int rate, const Settings& s) { Start(*this, rate, s); }
+};
+
 // Interleaved stereo noise, seeded.
 inline std::vector<float> Noise(size_t frames, float amplitude, unsigned seed) {
     std::vector<float> v(2 * frames);
@@ -71,32 +76,24 @@ inline std::vector<float> Render(ReverbEngine& e, const std::vector<float>& in, 
 }
 
 // The end-of-stream drain: silent blocks with the flush flag until one returns fewer frames than asked.
+// It ends well when that happens within maxBlocks, every sample is finite and the frames past the returned
+// count are within -313 dB. firstPeak is the peak of the first drain block.
 struct DrainResult {
-    bool ended = false, finite = true;
-    bool trimmedTailSilent = true;  // frames past the returned count are all within -313 dB
-    long blocks = 0;
-    int lastReturned = 0;
-    float firstPeak = 0.0f;  // peak of the first drain block
+    bool endedWell = false;
+    float firstPeak = 0.0f;
 };
 
 inline DrainResult Drain(ReverbEngine& e, long maxBlocks, int block = 512) {
     DrainResult r;
     std::vector<float> in(2 * block, 0.0f), out(2 * block);
-    for (r.blocks = 1; r.blocks <= maxBlocks; ++r.blocks) {
+    for (long b = 0; b < maxBlocks; ++b) {
         const int got = e.ProcessBlock(out.data(), out.data() + 1, in.data(), in.data() + 1, block, 2, 0, 1);
-        float peak = 0.0f;
         for (int i = 0; i < 2 * block; ++i) {
-            r.finite = r.finite && std::isfinite(out[i]);
-            if (i < 2 * got)
-                peak = std::max(peak, std::fabs(out[i]));
-            else if (std::fabs(out[i]) > 2.2387211385683394e-16)
-                r.trimmedTailSilent = false;
+            if (!std::isfinite(out[i]) || (i >= 2 * got && std::fabs(out[i]) > 2.2387211385683394e-16)) return r;
+            if (b == 0) r.firstPeak = std::max(r.firstPeak, std::fabs(out[i]));
         }
-        if (r.blocks == 1) r.firstPeak = peak;
-        r.lastReturned = got;
-        if (!r.finite) return r;
         if (got < block) {
-            r.ended = true;
+            r.endedWell = true;
             return r;
         }
     }

@@ -53,50 +53,10 @@ double shareAbove23k(const std::vector<float>& x, int rate) {
 
 }  // namespace
 
-TEST(IrResampler, RatiosAndTaps) {
-    IrResampler r;
-    struct {
-        int rate;
-        int64_t L, M;
-    } cases[] = {{48000, 160, 147}, {22050, 1, 2}, {96000, 320, 147}, {32000, 320, 441}, {44101, 44101, 44100},
-                 {768000, 2560, 147}};
-    for (auto c : cases) {
-        r.Setup(c.rate);
-        EXPECT_EQ(r.upFactor(), c.L) << c.rate;
-        EXPECT_EQ(r.downFactor(), c.M) << c.rate;
-        EXPECT_EQ(r.taps(), 60);
-    }
-}
-
-TEST(IrResampler, CutoffStaysBelowTheStoredNyquist) {
-    IrResampler r;
-    r.Setup(22050);
-    EXPECT_DOUBLE_EQ(r.cutoff(), 0.5 * 22050 - 89);
-    r.Setup(44100);
-    EXPECT_DOUBLE_EQ(r.cutoff(), 22050 - 89);
-    r.Setup(192000);
-    EXPECT_DOUBLE_EQ(r.cutoff(), 22050 - 89);
-    // Converting up adds no images: the stored data has nothing above 22.05 kHz, and neither has the result.
+// Converting up adds no images: the stored data has nothing above 22.05 kHz, and neither has the result.
+TEST(IrResampler, ConvertingUpAddsNoImages) {
     const std::vector<float> in = interleaved(44100);
     for (int rate : {96000, 192000}) EXPECT_LT(shareAbove23k(convertChannel(in, 0, rate), rate), 0.02) << rate;
-}
-
-TEST(IrResampler, LengthsFollowTheRate) {
-    const std::vector<float> in = interleaved(135168);
-    const size_t n48 = convertChannel(in, 0, 48000).size();
-    EXPECT_NEAR(static_cast<double>(n48), 135168.0 * 48000 / 44100, 2.0);  // about 147120
-    EXPECT_NEAR(static_cast<double>(convertChannel(in, 0, 22050).size()), 135168 / 2.0, 1.0);
-}
-
-TEST(IrResampler, KeepsTheLevelOfASlowSignal) {
-    // A slow sine passes at the converter's gain of 0.9 at any rate.
-    const std::vector<float> in = interleaved(20000);
-    for (int rate : {22050, 48000, 88200}) {
-        const std::vector<float> out = convertChannel(in, 1, rate);
-        float peak = 0.0f;
-        for (size_t i = out.size() / 4; i < out.size(); ++i) peak = std::max(peak, std::fabs(out[i]));
-        EXPECT_NEAR(peak, 0.45, 0.01) << rate;
-    }
 }
 
 TEST(IrResampler, HalfwayPhaseAt88200) {

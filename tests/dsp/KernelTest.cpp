@@ -1,4 +1,4 @@
-// The delay-network kernels and their networks: sizes, impulse arrival at the early outputs, recirculation,
+// The delay-network kernels: processing before a network exists, impulse arrival at the early outputs,
 // the echo's period and cross-feed, the shared extended-plate network, modulated reads in any arrangement,
 // the warm plate's stability, and every parameter extreme at every rate.
 #include <gtest/gtest.h>
@@ -13,12 +13,6 @@ namespace {
 
 using test::Settings;
 
-bool IsPrime(int n) {
-    for (int d = 2; d * d <= n; ++d)
-        if (n % d == 0) return false;
-    return n >= 2;
-}
-
 std::vector<float> Impulse(size_t frames, float left, float right) {
     std::vector<float> s(2 * frames, 0.0f);
     s[0] = left;
@@ -30,38 +24,6 @@ long FirstNonZero(const std::vector<float>& s, int channel) {
     for (size_t i = channel; i < s.size(); i += 2)
         if (s[i] != 0.0f) return static_cast<long>(i / 2);
     return -1;
-}
-
-// Early lines are prime and at least 3 long, network lines at least 220 (the minimum a room size of 0
-// gives), and every tap reads inside its line.
-TEST(NetworkSizing, LinesHaveTheirMinimumsAndEarlyLinesArePrime) {
-    for (int rate : {8000, 44100, 192000}) {
-        for (int room : {0, 7, 113, 200}) {
-            ReverbEngine e;
-            Settings s = test::Typical(2);
-            s.roomSize = room;
-            test::Start(e, rate, s);
-            const EngineProbe p(e);
-            for (int i = 0; i < 6; ++i) {
-                const int n = p.earlyLine(i).length;
-                EXPECT_TRUE(IsPrime(n) && (room > 0 || n == 3)) << rate << " " << room << " line " << i;
-            }
-            for (int i = 0; i < 20; ++i) {
-                const int n = p.line(i).length;
-                EXPECT_TRUE(n >= 220 && (room > 0 || n == 220)) << rate << " " << room << " line " << i;
-            }
-        }
-    }
-}
-
-// The warm plate modulates its eight tank lines and nothing else; the other plates modulate nothing,
-// even after the warm plate.
-TEST(NetworkSizing, OnlyTheWarmPlatesTankIsModulated) {
-    ReverbEngine e;
-    test::Start(e, 8000, test::Typical(1));
-    for (int i = 0; i < 12; ++i) EXPECT_EQ(EngineProbe(e).line(i).mod != nullptr, i >= 4) << i;
-    e.SetMode(0);
-    for (int i = 0; i < 16; ++i) EXPECT_EQ(EngineProbe(e).line(i).mod, nullptr) << i;
 }
 
 // Until the mode and the room size are both set there are no lines: every algorithm passes the block dry.
@@ -95,25 +57,6 @@ TEST(PlateKernel, ImpulseReachesEachEarlyOutputAfterItsDelayLine) {
         EXPECT_EQ(FirstNonZero(out, 1), n3) << mode;
         EXPECT_EQ(out[2 * n2], static_cast<float>(0.699999988079071 * 0.5)) << mode;
         EXPECT_EQ(out[2 * n3 + 1], static_cast<float>(-0.800000011920929 * 0.5)) << mode;
-    }
-}
-
-// Without decay the tank's second halves receive nothing, so nothing recirculates through the figure of
-// eight; with decay their lines carry the signal round.
-TEST(PlateKernel, DecayZeroDoesNotRecirculate) {
-    for (int mode : {0, 1, 2, 6}) {
-        for (int decay : {0, 50}) {
-            ReverbEngine e;
-            Settings s = test::Transparent(mode);
-            s.decay = decay;
-            test::Start(e, 22050, s);
-            test::Render(e, Impulse(20000, 0.5f, 0.5f));
-            bool tankCarries = false;
-            for (int k : {6, 7, 10, 11})
-                for (int i = 0; i < EngineProbe(e).line(k).length; ++i)
-                    tankCarries |= EngineProbe(e).line(k).samples[i] != 0.0;
-            EXPECT_EQ(tankCarries, decay != 0) << "mode " << mode << " decay " << decay;
-        }
     }
 }
 
@@ -211,7 +154,7 @@ TEST(PlateKernel, WarmPlateStaysBoundedAtMostResonantSettings) {
         EXPECT_GT(early, 1e-9f) << rate;
         EXPECT_LT(late, early * 0.1f) << rate;
         const test::DrainResult d = test::Drain(e, static_cast<long>(rate) * 60 / 512);
-        EXPECT_TRUE(d.finite && d.ended) << rate;
+        EXPECT_TRUE(d.endedWell) << rate;
     }
 }
 
@@ -242,7 +185,7 @@ TEST_P(PropertySweep, EveryParameterExtremeIsFiniteAndDiesAway) {
             test::Start(quiet, rate, s);
             test::Render(quiet, test::Noise(512, 1e-11f, 9));
             const test::DrainResult d = test::Drain(quiet, static_cast<long>(rate) * 120 / 512);
-            ASSERT_TRUE(d.finite && d.ended && d.trimmedTailSilent) << what;
+            ASSERT_TRUE(d.endedWell) << what;
         }
     }
 }

@@ -1,6 +1,5 @@
 // The transforms, the spectrum product and the FIR filter allocate nothing once their tables and buffers
-// exist, and report short memory cleanly. Every global operator new of this test binary is replaced by
-// one that counts while asked to and can refuse over-aligned requests (the library's tables and buffers).
+// exist. Every global operator new of this test binary is replaced by one that counts while asked to.
 #include <atomic>
 #include <cstdlib>
 #include <new>
@@ -14,12 +13,10 @@ namespace {
 
 std::atomic<bool> gCounting{false};
 std::atomic<int> gAllocations{0};
-std::atomic<bool> gRefuseAligned{false};
 
 void* allocate(std::size_t n, std::size_t align) {
     if (gCounting.load()) gAllocations.fetch_add(1);
     void* p = nullptr;
-    if (align > alignof(std::max_align_t) && gRefuseAligned.load()) return nullptr;
     if (align <= alignof(std::max_align_t)) {
         p = std::malloc(n ? n : 1);
     } else if (posix_memalign(&p, align, n ? n : 1) != 0) {
@@ -110,37 +107,6 @@ TEST(SpectralAllocation, NothingIsAllocatedOnceTablesAndBuffersExist) {
     }
     nspFirFree(&fir);
     EXPECT_TRUE(std::isfinite(sink));
-}
-
-// Refused memory is reported as such, leaves the data and the filter state alone, and the same calls work
-// once memory is back.
-TEST(SpectralAllocation, ShortMemoryIsReportedAndLeavesDataAlone) {
-    CaptureErrors cap;
-    const int order = 13;
-    nspsRealFftl(nullptr, 12, FlagInitOnly);  // the cache's lock exists from here on
-    nspsRealFftl(nullptr, order, FlagRelease);
-    const std::vector<float> orig = randomFloats(std::size_t(1) << order, seed(2200));
-    std::vector<float> x(orig), y(orig);
-    FirState fir;
-    const std::vector<float> taps = randomFloats(64, seed(2300));
-    gRefuseAligned.store(true);
-    nspsRealFftl(x.data(), order, FlagForward | FlagOutPerm);
-    nspsRealFftlNip(x.data(), y.data(), order, FlagForward | FlagOutPerm);
-    nspsCcsFftl(x.data(), order, FlagInverse | FlagInPerm);
-    EXPECT_EQ(nspsFirInit(taps.data(), 64, nullptr, &fir), 0);
-    gRefuseAligned.store(false);
-    const Reported r = cap.take();
-    EXPECT_EQ(r.calls, 4);
-    EXPECT_EQ(r.status, NspStsNoMem);
-    EXPECT_TRUE(fir.initMarker == nullptr && fir.taps == nullptr && fir.buffer == nullptr);
-    EXPECT_TRUE(x == orig && y == orig);
-    nspsRealFftl(x.data(), order, FlagForward | FlagOutPerm);
-    nspsCcsFftl(x.data(), order, FlagInverse | FlagInPerm);
-    for (std::size_t j = 0; j < x.size(); ++j) ASSERT_NEAR(x[j], orig[j], 1e-5);
-    ASSERT_NE(nspsFirInit(taps.data(), 64, nullptr, &fir), 0);
-    EXPECT_EQ(nspsFir(&fir, 1.0f), taps[0]);
-    nspFirFree(&fir);
-    EXPECT_EQ(cap.take().calls, 0);
 }
 
 #endif

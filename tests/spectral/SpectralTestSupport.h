@@ -1,5 +1,5 @@
-// Helpers of the spectral tests: seeded random data, a direct DFT in double precision, the instruction
-// sets to run each check on, and an error handler that records what the library reports.
+// Helpers of the spectral tests: seeded random data, the unit circle for direct transforms in double
+// precision, the RCPerm layout, and the instruction sets to run each check on.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -7,7 +7,6 @@
 #include <cmath>
 #include <cstdlib>
 #include <random>
-#include <string>
 #include <vector>
 
 #include "spectral/FftTables.h"
@@ -70,41 +69,6 @@ public:
 private:
     ulvetta::spectral::Isa before_;
     bool ok_;
-};
-
-// Records every report while installed; take() returns what was reported since the last take().
-struct Reported {
-    int calls = 0, status = 0;
-    std::string routine, message;
-};
-
-class CaptureErrors {
-public:
-    CaptureErrors() : previous_(ulvetta::nspRedirectError(&record)) { take(); }
-    ~CaptureErrors() {
-        ulvetta::nspRedirectError(previous_);
-        ulvetta::nspSetErrStatus(ulvetta::NspStsOk);
-    }
-    Reported take() {
-        const Reported r = last();
-        last() = Reported{};
-        ulvetta::nspSetErrStatus(ulvetta::NspStsOk);
-        return r;
-    }
-
-private:
-    static Reported& last() {
-        static Reported r;
-        return r;
-    }
-    static void record(int status, const char* routine, const char* message) {
-        Reported& r = last();
-        ++r.calls;
-        r.status = status;
-        r.routine = routine ? routine : "";
-        r.message = message ? message : "";
-    }
-    ulvetta::NspErrorHandler previous_;
 };
 
 }  // namespace spectral_test
