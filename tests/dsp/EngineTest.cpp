@@ -16,7 +16,9 @@ namespace {
 
 using test::Settings;
 
-bool IsBypass(const BiquadSection& s) { return s.b0 == 1.0 && s.b1 == 0.0 && s.b2 == 0.0 && s.a1 == 0.0 && s.a2 == 0.0; }
+bool IsBypass(const BiquadSection& s) {
+    return s.b0 == 1.0 && s.b1 == 0.0 && s.b2 == 0.0 && s.a1 == 0.0 && s.a2 == 0.0;
+}
 
 int Block(ReverbEngine& e, std::vector<float>& in, std::vector<float>& out, int frames, int flush) {
     return e.ProcessBlock(out.data(), out.data() + 1, in.data(), in.data() + 1, frames, 2, 0, flush);
@@ -179,16 +181,6 @@ TEST(BlockProcessor, NonFiniteInputIsTakenAsSilence) {
         const std::vector<float> later = test::Render(e, test::Noise(2000, 0.5f, 1));
         for (float v : later) ASSERT_TRUE(std::isfinite(v)) << mode;
     }
-}
-
-TEST(BlockProcessor, MonoBufferGrowsToTheLargestBlockOnly) {
-    test::Started e(44100, test::Typical(0));
-    std::vector<float> in(2 * 4096, 0.0f), out(2 * 4096);
-    Block(e, in, out, 100, 0);
-    EXPECT_EQ(EngineProbe(e).monoCapacity(), 100);
-    Block(e, in, out, 4096, 0);
-    Block(e, in, out, 10, 0);
-    EXPECT_EQ(EngineProbe(e).monoCapacity(), 4096);
 }
 
 // A tail decaying through the smallest floats leaves exact zeros at the output, never denormal floats.

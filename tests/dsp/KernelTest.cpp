@@ -1,5 +1,5 @@
 // The delay-network kernels: processing before a network exists, impulse arrival at the early outputs,
-// the echo's period and cross-feed, the shared extended-plate network, modulated reads in any arrangement,
+// the echo's period and cross-feed, modulated reads in any arrangement,
 // the warm plate's stability, and every parameter extreme at every rate.
 #include <gtest/gtest.h>
 
@@ -87,20 +87,6 @@ TEST(EchoKernel, RepeatsEveryPeriodWithCrossFeed) {
         }
         ASSERT_NEAR(out[2 * i], l, 1e-7) << "frame " << i;
         ASSERT_NEAR(out[2 * i + 1], r, 1e-7) << "frame " << i;
-    }
-}
-
-// Modes 2 and 6 run one network and differ only in how the taps are weighted.
-TEST(ExtendedPlateKernel, ModesTwoAndSixShareTheNetwork) {
-    ReverbEngine two, six;
-    test::Start(two, 44100, test::Typical(2));
-    test::Start(six, 44100, test::Typical(6));
-    const std::vector<float> in = test::Noise(30000, 0.5f, 21);
-    EXPECT_NE(test::Render(two, in), test::Render(six, in));
-    for (int k = 0; k < 20; ++k) {
-        const DelayLine &a = EngineProbe(two).line(k), &b = EngineProbe(six).line(k);
-        ASSERT_EQ(a.length, b.length);
-        ASSERT_TRUE(std::equal(a.samples.get(), a.samples.get() + a.length, b.samples.get())) << "line " << k;
     }
 }
 

@@ -22,37 +22,19 @@ void* allocate(std::size_t n, std::size_t align) {
     } else if (posix_memalign(&p, align, n ? n : 1) != 0) {
         p = nullptr;
     }
-    return p;
-}
-
-void* allocateOrThrow(std::size_t n, std::size_t align) {
-    void* p = allocate(n, align);
     if (!p) throw std::bad_alloc();
     return p;
 }
 
 }  // namespace
 
-void* operator new(std::size_t n) { return allocateOrThrow(n, 0); }
-void* operator new[](std::size_t n) { return allocateOrThrow(n, 0); }
-void* operator new(std::size_t n, const std::nothrow_t&) noexcept { return allocate(n, 0); }
-void* operator new[](std::size_t n, const std::nothrow_t&) noexcept { return allocate(n, 0); }
-void* operator new(std::size_t n, std::align_val_t a) { return allocateOrThrow(n, std::size_t(a)); }
-void* operator new[](std::size_t n, std::align_val_t a) { return allocateOrThrow(n, std::size_t(a)); }
-void* operator new(std::size_t n, std::align_val_t a, const std::nothrow_t&) noexcept { return allocate(n, std::size_t(a)); }
-void* operator new[](std::size_t n, std::align_val_t a, const std::nothrow_t&) noexcept { return allocate(n, std::size_t(a)); }
+// The library's array and nothrow forms call these.
+void* operator new(std::size_t n) { return allocate(n, 0); }
+void* operator new(std::size_t n, std::align_val_t a) { return allocate(n, std::size_t(a)); }
 void operator delete(void* p) noexcept { std::free(p); }
-void operator delete[](void* p) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::size_t) noexcept { std::free(p); }
-void operator delete(void* p, const std::nothrow_t&) noexcept { std::free(p); }
-void operator delete[](void* p, const std::nothrow_t&) noexcept { std::free(p); }
 void operator delete(void* p, std::align_val_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::align_val_t) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
-void operator delete(void* p, std::align_val_t, const std::nothrow_t&) noexcept { std::free(p); }
-void operator delete[](void* p, std::align_val_t, const std::nothrow_t&) noexcept { std::free(p); }
 
 using namespace ulvetta;
 using namespace spectral_test;

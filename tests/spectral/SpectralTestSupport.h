@@ -43,7 +43,9 @@ struct UnitCircle {
 };
 
 // Real and imaginary part of bin k (0 <= k <= N/2) of a spectrum stored in RCPerm.
-inline float permRe(const float* x, std::size_t n, std::size_t k) { return k == 0 ? x[0] : k == n / 2 ? x[1] : x[2 * k]; }
+inline float permRe(const float* x, std::size_t n, std::size_t k) {
+    return k == 0 ? x[0] : k == n / 2 ? x[1] : x[2 * k];
+}
 inline float permIm(const float* x, std::size_t n, std::size_t k) { return k == 0 || k == n / 2 ? 0.0f : x[2 * k + 1]; }
 
 // The instruction sets this build and processor can run.
