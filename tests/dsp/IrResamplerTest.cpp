@@ -1,10 +1,11 @@
+// The response rate converter: its phase and gain at twice the rate, channels converted independently
+// on one buffer, rows derived on use equal to the table, and its capacity.
 #include <gtest/gtest.h>
 
 #include <cmath>
 #include <vector>
 
 #include "engine/IrResampler.h"
-#include "processing/BiquadSection.h"
 
 using namespace ulvetta;
 
@@ -35,29 +36,7 @@ std::vector<float> convertChannel(const std::vector<float>& in, int channel, int
     return mono;
 }
 
-// Share of the energy above 23 kHz, through four cascaded high-pass sections.
-double shareAbove23k(const std::vector<float>& x, int rate) {
-    std::vector<float> y = x;
-    for (int k = 0; k < 4; ++k) {
-        BiquadSection s;
-        DesignHighPass(s, rate, 23000);
-        ProcessMono(s, y.data(), static_cast<int>(y.size()));
-    }
-    double all = 0.0, high = 0.0;
-    for (size_t i = 0; i < x.size(); ++i) {
-        all += double(x[i]) * x[i];
-        high += double(y[i]) * y[i];
-    }
-    return high / all;
-}
-
 }  // namespace
-
-// Converting up adds no images: the stored data has nothing above 22.05 kHz, and neither has the result.
-TEST(IrResampler, ConvertingUpAddsNoImages) {
-    const std::vector<float> in = interleaved(44100);
-    for (int rate : {96000, 192000}) EXPECT_LT(shareAbove23k(convertChannel(in, 0, rate), rate), 0.02) << rate;
-}
 
 TEST(IrResampler, HalfwayPhaseAt88200) {
     // L = 2, M = 1: output 2k lands on input k - 29 (the kernel's centre), output 2k + 1 halfway between
