@@ -47,15 +47,11 @@ TEST(DelayElements, AllpassImpulseResponsesFollowTheirDifferenceEquations) {
         for (int i = 0; i < 200 * n; ++i) {
             const double x = (i == 0) ? 1.0 : 0.0;
             const double ya = AllpassA(a, x), yb = AllpassB(b, x);
-            if (i == 0) {
-                EXPECT_DOUBLE_EQ(ya, g);
-                EXPECT_DOUBLE_EQ(yb, -g);
-            } else if (i == n) {
-                EXPECT_DOUBLE_EQ(ya, 1.0 - g * g);
-                EXPECT_DOUBLE_EQ(yb, 1.0 - g * g);
+            if (i == 0 || i == n) {
+                EXPECT_DOUBLE_EQ(ya, i == 0 ? g : 1.0 - g * g);
+                EXPECT_DOUBLE_EQ(yb, i == 0 ? -g : 1.0 - g * g);
             } else if (i % n != 0) {
-                ASSERT_EQ(ya, 0.0);
-                ASSERT_EQ(yb, 0.0);
+                ASSERT_TRUE(ya == 0.0 && yb == 0.0) << i;
             }
             energyA += ya * ya;
             energyB += yb * yb;
@@ -77,15 +73,11 @@ TEST(DelayElements, ModulatorPeriodRoundsUpAndOffsetsSweepAHalfSine) {
     for (int i = 0; i < 2 * p; ++i) {
         const double offset = m.Tick();
         const int phase = i % p;
-        if (phase == 0) {
-            ASSERT_EQ(offset, 0.0);
-        } else if (phase == p / 2) {
-            ASSERT_NEAR(offset, 7.0, 1e-12);
-        } else if (phase == p / 4) {
-            ASSERT_NEAR(offset, 7.0 * std::sqrt(0.5), 1e-9);
+        if (phase == 0 || phase == p / 4 || phase == p / 2) {
+            const double expected = phase == 0 ? 0.0 : phase == p / 2 ? 7.0 : 7.0 * std::sqrt(0.5);
+            ASSERT_NEAR(offset, expected, phase == p / 4 ? 1e-9 : phase == p / 2 ? 1e-12 : 0.0) << i;
         }
-        ASSERT_GE(offset, 0.0);
-        ASSERT_LE(offset, 7.0);
+        ASSERT_TRUE(offset >= 0.0 && offset <= 7.0) << i;
     }
 }
 

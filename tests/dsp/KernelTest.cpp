@@ -139,8 +139,7 @@ TEST(PlateKernel, WarmPlateStaysBoundedAtMostResonantSettings) {
         }
         EXPECT_GT(early, 1e-9f) << rate;
         EXPECT_LT(late, early * 0.1f) << rate;
-        const test::DrainResult d = test::Drain(e, static_cast<long>(rate) * 60 / 512);
-        EXPECT_TRUE(d.endedWell) << rate;
+        EXPECT_TRUE(test::Drain(e, static_cast<long>(rate) * 60 / 512).endedWell) << rate;
     }
 }
 
@@ -170,8 +169,7 @@ TEST_P(PropertySweep, EveryParameterExtremeIsFiniteAndDiesAway) {
             for (float v : test::Render(loud, test::Noise(2048, 1.0f, 5))) ASSERT_LT(std::fabs(v), 100.0f) << what;
             test::Start(quiet, rate, s);
             test::Render(quiet, test::Noise(512, 1e-11f, 9));
-            const test::DrainResult d = test::Drain(quiet, static_cast<long>(rate) * 120 / 512);
-            ASSERT_TRUE(d.endedWell) << what;
+            ASSERT_TRUE(test::Drain(quiet, static_cast<long>(rate) * 120 / 512).endedWell) << what;
         }
     }
 }

@@ -1,6 +1,6 @@
 // The real FFT against a direct transform in double precision for every order and instruction set, round
-// trips, the unit impulse, out-of-place use, the vector sets against each other bit for bit, and the
-// table cache under concurrent first use.
+// trips, out-of-place use, the vector sets against each other bit for bit, and the table cache under
+// concurrent first use.
 #include <atomic>
 #include <cstring>
 
@@ -98,9 +98,8 @@ TEST(RealFft, ForwardAndInverseMatchDirectTransformsForEveryOrderAndInstructionS
     EXPECT_EQ(nspGetErrStatus(), NspStsOk);
 }
 
-// Forward then inverse gives the input back, in place and out of place (which leaves its input alone), and
-// a unit impulse has a flat spectrum.
-TEST(RealFft, RoundTripsOutOfPlaceUseAndTheUnitImpulse) {
+// Forward then inverse gives the input back; out of place the transform leaves its input alone.
+TEST(RealFft, RoundTripsAndOutOfPlaceUse) {
     for (int order : {0, 1, 2, 5, 6, 7, 12, 15, 17}) {
         const std::size_t n = std::size_t(1) << order;
         const std::vector<float> x = randomFloats(n, seed(300 + order), -100.0f, 100.0f);
@@ -115,10 +114,6 @@ TEST(RealFft, RoundTripsOutOfPlaceUseAndTheUnitImpulse) {
             worst = std::max(worst, double(std::fabs(y[j] - x[j])));
         }
         EXPECT_LE(worst, 2.0 * bound(order, std::sqrt(energy / double(n)))) << order;
-        std::vector<float> impulse(n, 0.0f);
-        impulse[0] = 1.0f;
-        const std::vector<float> flat = forwardOf(impulse, order, FlagOutPerm);  // 1, 1, then (1, 0) per bin
-        for (std::size_t j = 0; j < n; ++j) ASSERT_EQ(flat[j], (j < 2 || j % 2 == 0) ? 1.0f : 0.0f) << j;
     }
 }
 
