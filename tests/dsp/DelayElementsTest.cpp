@@ -64,9 +64,9 @@ TEST(DelayElements, AllpassImpulseResponsesFollowTheirDifferenceEquations) {
 TEST(DelayElements, ModulatorPeriodRoundsUpAndOffsetsSweepAHalfSine) {
     Modulator m;
     m.SetModSampleRate(48000);
-    m.SetModRate(0.27);  // 177777.8 samples
+    m.SetModRate(0.27);  // 177777.8 samples, rounded up
     EXPECT_EQ(m.period, 177778);
-    m.SetModRate(0.5);  // exactly 96000
+    m.SetModRate(0.5);  // 96000: a quarter period is a whole number of samples
     EXPECT_EQ(m.period, 96000);
     m.SetModDepth(7);
     const int p = m.period;

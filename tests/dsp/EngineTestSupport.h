@@ -75,9 +75,8 @@ inline std::vector<float> Render(ReverbEngine& e, const std::vector<float>& in, 
     return out;
 }
 
-// The end-of-stream drain: silent blocks with the flush flag until one returns fewer frames than asked.
-// It ends well when that happens within maxBlocks, every sample is finite and the frames past the returned
-// count are within -313 dB. firstPeak is the peak of the first drain block.
+// The end-of-stream drain: silent blocks with the flush flag until one returns fewer frames than asked. It
+// ends well when that happens within maxBlocks with finite samples, silent (-313 dB) past the count.
 struct DrainResult {
     bool endedWell = false;
     float firstPeak = 0.0f;

@@ -61,10 +61,7 @@ TEST(IrResampler, ChannelsConvertIndependentlyOnOneBuffer) {
     const int nr = right.Run(out.data() + 1, in.data() + 1, 5000, 6000);
     ASSERT_EQ(nl, nr);
     const std::vector<float> l = convertChannel(in, 0, 48000), r = convertChannel(in, 1, 48000);
-    for (int i = 0; i < nl; ++i) {
-        ASSERT_EQ(out[2 * i], l[i]);
-        ASSERT_EQ(out[2 * i + 1], r[i]);
-    }
+    for (int i = 0; i < nl; ++i) ASSERT_TRUE(out[2 * i] == l[i] && out[2 * i + 1] == r[i]) << i;
 }
 
 TEST(IrResampler, RowsDerivedOnUseEqualTheTable) {
