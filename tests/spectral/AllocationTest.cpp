@@ -14,27 +14,45 @@ namespace {
 std::atomic<bool> gCounting{false};
 std::atomic<int> gAllocations{0};
 
-void* allocate(std::size_t n, std::size_t align) {
+void* allocate(std::size_t n, std::size_t align) noexcept {
     if (gCounting.load()) gAllocations.fetch_add(1);
     void* p = nullptr;
-    if (align <= alignof(std::max_align_t)) {
-        p = std::malloc(n ? n : 1);
-    } else if (posix_memalign(&p, align, n ? n : 1) != 0) {
-        p = nullptr;
-    }
-    if (!p) throw std::bad_alloc();
-    return p;
+    if (align <= alignof(std::max_align_t)) return std::malloc(n ? n : 1);
+    return posix_memalign(&p, align, n ? n : 1) == 0 ? p : nullptr;
+}
+
+void* allocateOrThrow(std::size_t n, std::size_t align) {
+    if (void* p = allocate(n, align)) return p;
+    throw std::bad_alloc();
 }
 
 }  // namespace
 
-// The library's array and nothrow forms call these.
-void* operator new(std::size_t n) { return allocate(n, 0); }
-void* operator new(std::size_t n, std::align_val_t a) { return allocate(n, std::size_t(a)); }
+// Every form, so that no allocation bypasses the count (a sanitizer supplies its own defaults).
+void* operator new(std::size_t n) { return allocateOrThrow(n, 0); }
+void* operator new[](std::size_t n) { return allocateOrThrow(n, 0); }
+void* operator new(std::size_t n, const std::nothrow_t&) noexcept { return allocate(n, 0); }
+void* operator new[](std::size_t n, const std::nothrow_t&) noexcept { return allocate(n, 0); }
+void* operator new(std::size_t n, std::align_val_t a) { return allocateOrThrow(n, std::size_t(a)); }
+void* operator new[](std::size_t n, std::align_val_t a) { return allocateOrThrow(n, std::size_t(a)); }
+void* operator new(std::size_t n, std::align_val_t a, const std::nothrow_t&) noexcept {
+    return allocate(n, std::size_t(a));
+}
+void* operator new[](std::size_t n, std::align_val_t a, const std::nothrow_t&) noexcept {
+    return allocate(n, std::size_t(a));
+}
 void operator delete(void* p) noexcept { std::free(p); }
+void operator delete[](void* p) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t) noexcept { std::free(p); }
+void operator delete[](void* p, std::size_t) noexcept { std::free(p); }
+void operator delete(void* p, const std::nothrow_t&) noexcept { std::free(p); }
+void operator delete[](void* p, const std::nothrow_t&) noexcept { std::free(p); }
 void operator delete(void* p, std::align_val_t) noexcept { std::free(p); }
+void operator delete[](void* p, std::align_val_t) noexcept { std::free(p); }
 void operator delete(void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
+void operator delete[](void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
+void operator delete(void* p, std::align_val_t, const std::nothrow_t&) noexcept { std::free(p); }
+void operator delete[](void* p, std::align_val_t, const std::nothrow_t&) noexcept { std::free(p); }
 
 using namespace ulvetta;
 using namespace spectral_test;
