@@ -5,23 +5,12 @@
 #include <cmath>
 #include <vector>
 
+#include "dsp/EngineTestSupport.h"
 #include "engine/IrResampler.h"
 
 using namespace ulvetta;
 
 namespace {
-
-// Interleaved stereo test signal: a fixed pseudo-random sequence on the left, a sine on the right.
-std::vector<float> interleaved(int frames) {
-    std::vector<float> v(2 * frames);
-    uint32_t s = 12345;
-    for (int i = 0; i < frames; ++i) {
-        s = s * 1664525u + 1013904223u;
-        v[2 * i] = static_cast<float>((s >> 8) / 8388608.0 - 1.0);
-        v[2 * i + 1] = static_cast<float>(0.5 * std::sin(i * 0.05));
-    }
-    return v;
-}
 
 std::vector<float> convertChannel(const std::vector<float>& in, int channel, int rate, int64_t tableLimit = 8192) {
     const int frames = static_cast<int>(in.size() / 2);
@@ -52,7 +41,7 @@ TEST(IrResampler, HalfwayPhaseAt88200) {
 }
 
 TEST(IrResampler, ChannelsConvertIndependentlyOnOneBuffer) {
-    const std::vector<float> in = interleaved(5000);
+    const std::vector<float> in = test::Noise(5000, 1.0f, 12345);
     IrResampler left, right;
     left.Setup(48000);
     right.Setup(48000);
@@ -65,7 +54,7 @@ TEST(IrResampler, ChannelsConvertIndependentlyOnOneBuffer) {
 }
 
 TEST(IrResampler, RowsDerivedOnUseEqualTheTable) {
-    const std::vector<float> in = interleaved(3000);
+    const std::vector<float> in = test::Noise(3000, 1.0f, 12345);
     for (int rate : {48000, 44101}) {
         const std::vector<float> table = convertChannel(in, 0, rate, 1 << 20);
         const std::vector<float> derived = convertChannel(in, 0, rate, 0);
@@ -74,7 +63,7 @@ TEST(IrResampler, RowsDerivedOnUseEqualTheTable) {
 }
 
 TEST(IrResampler, NeverWritesPastItsCapacity) {
-    const std::vector<float> in = interleaved(1000);
+    const std::vector<float> in = test::Noise(1000, 1.0f, 12345);
     IrResampler r;
     r.Setup(96000);
     std::vector<float> out(2 * 100 + 2, 7.0f);
