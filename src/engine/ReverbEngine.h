@@ -169,7 +169,6 @@ private:
     // Number of rebuilds that got past the unset-value guard (for tests and diagnostics).
     int32_t rebuildCount = 0;
 
-
     // The highest frequency a filter design receives: just under half the rate, so that a section
     // stays stable at any rate while the parameter keeps the value the user set.
     int designLimit(int hz) const;

@@ -147,6 +147,7 @@ void ReverbEngine::finishMeter() {
     cleanSmoothState();
 }
 
+// The colour states (the second is the echo's right channel) and the two damping states.
 void ReverbEngine::flushKernelStates() {
     colourState = flushTiny(colourState);
     colourState2 = flushTiny(colourState2);
