@@ -11,7 +11,6 @@
 #include <memory>
 #include <vector>
 
-#include "engine/ReverbEngine.h"
 #include "filter/ReverbCore.h"
 
 using namespace ulvetta;
@@ -68,14 +67,13 @@ ZitaSetup* zitaFor(int mode, int rate) {
     slot.reset(new ZitaSetup);
     ReverbCore core;
     setDecay100(core, mode, rate);
-    const ReverbEngine& e = core.engineForInspection();
-    slot->left.assign(e.irLeft.get(), e.irLeft.get() + e.irLength);
-    slot->right.assign(e.irRight.get(), e.irRight.get() + e.irLength);
+    if (!core.preparedResponse(slot->left, slot->right)) return nullptr;
+    const int length = static_cast<int>(slot->left.size());
     Convproc& conv = slot->conv;
     conv.set_options(Convproc::OPT_LATE_CONTIN);
-    if (conv.configure(2, 2, e.irLength, 64, Convproc::MINPART, Convproc::MAXPART, 0.5f) != 0) return nullptr;
-    conv.impdata_create(0, 0, 1, slot->left.data(), 0, e.irLength);
-    conv.impdata_create(1, 1, 1, slot->right.data(), 0, e.irLength);
+    if (conv.configure(2, 2, length, 64, Convproc::MINPART, Convproc::MAXPART, 0.5f) != 0) return nullptr;
+    conv.impdata_create(0, 0, 1, slot->left.data(), 0, length);
+    conv.impdata_create(1, 1, 1, slot->right.data(), 0, length);
     if (conv.start_process(0, SCHED_OTHER) != 0 || conv.state() != Convproc::ST_PROC) return nullptr;
     return slot.get();
 }

@@ -57,7 +57,7 @@ void Setup(ReverbEngine& e, int mode) {
     e.SetNotchGain(0.0);
     e.SetNotchQ(3.0);
     e.SetMode(mode);
-    e.meterSource = 1;  // the output meter, as the effect core sets it by default
+    e.SetMeterSource(1);  // the output meter, as the effect core sets it by default
     e.ResetState();
 }
 

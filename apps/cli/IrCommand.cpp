@@ -41,14 +41,16 @@ void exportResponse(ReverbCore& core, int rate, const std::string& path) {
                        ") is not a convolution reverb; choose 3, 4 or 5");
     core.setFormat(static_cast<float>(rate), 0, 2, 2);
     core.applyAll();
-    const ReverbEngine& engine = core.engineForInspection();
+    std::vector<float> left, right;
+    if (!core.preparedResponse(left, right))
+        throw CliError("no response was prepared for algorithm " + std::to_string(algorithm), kExitFailure);
     AudioOutput out(path, rate, true, SF_FORMAT_WAV);
-    std::vector<float> frames(2 * static_cast<size_t>(engine.irLength));
-    for (int32_t i = 0; i < engine.irLength; ++i) {
-        frames[2 * i] = engine.irLeft[i];
-        frames[2 * i + 1] = engine.irRight[i];
+    std::vector<float> frames(2 * left.size());
+    for (size_t i = 0; i < left.size(); ++i) {
+        frames[2 * i] = left[i];
+        frames[2 * i + 1] = right[i];
     }
-    out.write(frames.data(), engine.irLength);
+    out.write(frames.data(), static_cast<long long>(left.size()));
     out.finish();
 }
 

@@ -141,4 +141,11 @@ void ReverbEngine::PrepareImpulse(int frames, const float* table) {
             if (partitions[i].size >= kWorkerPartition) partitions[i].StartWorker(kWorkerStack);
 }
 
+bool ReverbEngine::PreparedResponse(std::vector<float>& left, std::vector<float>& right) const {
+    if (mode < 3 || mode > 5 || irLeft == nullptr || irRight == nullptr || irLength <= 0) return false;
+    left.assign(irLeft.get(), irLeft.get() + irLength);
+    right.assign(irRight.get(), irRight.get() + irLength);
+    return true;
+}
+
 }  // namespace ulvetta

@@ -11,6 +11,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <vector>
 
 #include "processing/BiquadSection.h"
 #include "processing/ConvPartition.h"
@@ -23,6 +24,13 @@ namespace ulvetta {
 struct LevelOwner {
     float level = 0.0f;  // peak meter value, linear
 };
+
+// How the end of the stream is detected: by the pre-delay line falling silent when it is in the path
+// (always, only while "Pre Delay" is on, or never), or by counting out the convolution's response.
+enum class EndOfStream { PreDelayAlways, PreDelayWhenOn, PreDelayNever, ResponseLength };
+// What the input stage makes of the block before the kernel runs: nothing (the kernel reads the input
+// itself), the mono sum through the filter sections, or both channels through them.
+enum class InputStage { None, Mono, Stereo };
 
 class ReverbEngine {
 public:
@@ -79,8 +87,27 @@ public:
     int ProcessBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                      int stride, int accumulate, int flush);
 
-    // Fields, in declaration order. Public: the engine is a plain state record that the core, the kernels
-    // and the tests read directly.
+    // The object whose level the meters raise and decay (nullptr: no meter).
+    void SetOwner(LevelOwner* o) { owner = o; }
+    // The level meter's source: 0 input, 1 output, 2 wet.
+    void SetMeterSource(int source) { meterSource = source; }
+    // Records of the prepared convolution response, the direct head included (0 when none is prepared).
+    int32_t PartitionCount() const { return partitionCount; }
+    // Copies the prepared convolution response (one vector per channel, at the stream rate); false when the
+    // current mode is not a convolution or no response is prepared. Allocates.
+    bool PreparedResponse(std::vector<float>& left, std::vector<float>& right) const;
+
+private:
+    // The prepared response, irLength samples per channel.
+    std::unique_ptr<float[]> irLeft, irRight;
+    int32_t irLength = 0;
+    friend class EngineProbe;  // the tests' read access
+    // The kernels' shared pieces outside the class (engine/kernels/PlateNetwork.h).
+    friend struct PlateInput;
+    friend struct NetworkViews;
+    friend bool NetworkReady(const ReverbEngine& e, int lineCount, int tapCount, bool early);
+
+    // Fields, in declaration order.
     LevelOwner* owner = nullptr;
     int32_t sampleRate = 0;
     int32_t mode = -1;
@@ -124,13 +151,11 @@ public:
     float smoothCoefs[5] = {0, 0, 0, 0, 0};  // b0, b1, b2, a1, a2
     float smoothState[4] = {0, 0, 0, 0};     // x1, x2, y1, y2
     int32_t meterSource = 0;                 // 0 input, 1 output, 2 wet
-    std::unique_ptr<float[]> irLeft, irRight;  // the prepared response, irLength samples each
     HistoryRing historyLeft, historyRight;       // the convolution's input history
     float headLeft = 0.0f, headRight = 0.0f;     // latest outputs of the direct FIR head
     double partSumLeft[32] = {}, partSumRight[32] = {};  // the partitions' output for the current 32 frames
     FirState firLeft, firRight;                  // the response's first 64 samples, applied directly
     int32_t partitionCount = 0;                  // records in partitions, the head (record 0) included
-    int32_t irLength = 0;
     int32_t convCounter = 0;
     int32_t tailCountdown = 0;  // frames of convolution tail still owed after the first flush block
     // Run the jobs of large partitions on the streaming thread instead of their workers (for tests;
@@ -142,18 +167,33 @@ public:
     // Number of rebuilds that got past the unset-value guard (for tests and diagnostics).
     int32_t rebuildCount = 0;
 
-private:
     // The highest frequency a filter design receives: just under half the rate, so that a section
     // stays stable at any rate while the parameter keeps the value the user set.
     int designLimit(int hz) const;
 
-    // Pieces of the per-block frame shared by the kernels. preDelayInPath: the kernel writes the pre-delay
-    // line, so the end-of-stream tail cannot end while it still holds signal.
-    void latchFlush(int flush, bool preDelayInPath);
+    // A kernel's policy is a type with these members:
+    //   static constexpr bool kMeterBeforeLatch;    meter decay and input meter before the end-of-stream latch
+    //   static constexpr EndOfStream kEnd;
+    //   static constexpr InputStage kInput;
+    //   static constexpr bool kFlushNetworkStates;  colour and damping states cleaned after the block
+    using KernelFrames = void (ReverbEngine::*)(float* outLeft, float* outRight, const float* inLeft,
+                                                const float* inRight, int frames, int stride, int accumulate);
+    template <class Policy, KernelFrames kFrames>
+    int RunBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames, int stride,
+                 int accumulate, int flush);
+
+    // Pieces of the block frame, called by RunBlock.
+    void latchEndOfStream(int flush, EndOfStream rule);
     void decayMeter(int frames);
     void meterInput(const float* inLeft, const float* inRight, int frames, int stride);
+    void meterBlockInput(const float* inLeft, const float* inRight, int frames, int stride) {
+        decayMeter(frames);
+        if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
+    }
     void makeMono(const float* inLeft, const float* inRight, int frames, int stride);
     void filterMono(int frames);
+    // Both channels with the input gain, interleaved in the scratch buffer.
+    void makeStereo(const float* inLeft, const float* inRight, int frames, int stride);
     void filterStereo(float* frames, int count);
     // Mixes one frame with the given wet and dry gains (the convolution kernel uses the levels, the others
     // the gains) and runs the wet or the output meter into meterPeak_ when it is the meter's source.
@@ -167,7 +207,11 @@ private:
     void startMeter() { meterPeak_ = 0.0f; }
     void finishMeter();
     void flushKernelStates();
+    // Frames of the block that carry signal: all of them until the trim is armed, then up to the last frame
+    // above -313 dB.
     int trimmedLength(const float* outLeft, const float* outRight, int frames, int stride) const;
+    // The convolution's count: all frames until the end of the stream, then what remains of the response.
+    int countedLength(int frames, int flush);
 
     // Meter smoothing: one sample through the smoother, returning its output.
     float smooth(float v);
@@ -199,6 +243,20 @@ private:
                 int accumulate, int flush);
     int processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                            int stride, int accumulate, int flush);
+    // The kernels' frames, run by RunBlock between the input stage and the block's meter.
+    template <Reads kDiffusers, Reads kTank>
+    void plateFrames(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                     int stride, int accumulate);
+    template <Reads kReads>
+    void extendedPlateFrames(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                             int stride, int accumulate);
+    template <Reads kReads>
+    void echoFrames(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                    int stride, int accumulate);
+    void dryFrames(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames, int stride,
+                   int accumulate);
+    void convolutionFrames(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
+                           int stride, int accumulate);
 
     // Running peak of the wet or output meter within the current block.
     float meterPeak_ = 0.0f;

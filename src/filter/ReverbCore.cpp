@@ -26,7 +26,7 @@ ReverbCore::ReverbCore() {
     params_.push_back(&table_.records[15]);
     for (int i = 0; i < kSoundParamCount; ++i) mediaParamIds_[i] = i;
     host_ = this;
-    engine_.owner = this;
+    engine_.SetOwner(this);
 }
 
 ReverbCore::~ReverbCore() {
@@ -54,7 +54,7 @@ bool ReverbCore::applyParam(ParamDesc& p) {
         case kNotchGain: engine_.SetNotchGain(p.value * 0.1); break;
         case kNotchQ: engine_.SetNotchQ(p.value * 0.1); break;
         case kAlgorithm: engine_.SetMode(p.value); break;
-        case kMeterSource: engine_.meterSource = p.value; break;
+        case kMeterSource: engine_.SetMeterSource(p.value); break;
         default: return false;
     }
     applied_ = true;
@@ -139,6 +139,11 @@ void ReverbCore::parameterChanged(int32_t id, float position) {
     if (captureTarget_ != nullptr) captureTarget_->captureParameter(id, position);
 }
 
+bool ReverbCore::preparedResponse(std::vector<float>& left, std::vector<float>& right) {
+    MutexLock g(lock_);
+    return engine_.PreparedResponse(left, right);
+}
+
 float ReverbCore::getStatus(int32_t code) {
     MutexLock g(lock_);
     if (code == kStatusLoad) {
@@ -151,7 +156,7 @@ float ReverbCore::getStatus(int32_t code) {
             case 3:
             case 4:
             case 5:
-                switch (engine_.partitionCount) {
+                switch (engine_.PartitionCount()) {
                     case 18: return 0.485f;
                     case 19: return 0.538f;
                     case 20: return 0.615f;

@@ -127,7 +127,13 @@ public:
 
     static constexpr int kTextCapacity = 32;
 
-    // Read-only views for tests and diagnostics; call them only while nothing else uses the core.
+    // Copies the convolution response prepared for the applied settings (one sample per frame at the stream
+    // rate, per channel); false when the algorithm is not a convolution or nothing is prepared yet.
+    // Any thread; takes the core's lock (a block waits for the copy); allocates the two vectors.
+    bool preparedResponse(std::vector<float>& left, std::vector<float>& right);
+
+    // The engine for tests (through EngineProbe) and diagnostics; use it only while nothing else uses the
+    // core.
     const ReverbEngine& engineForInspection() const { return engine_; }
 
 private:

@@ -14,11 +14,6 @@ void BiquadSection::SetBypass() {
     b1 = b2 = a1 = a2 = 0.0;
 }
 
-void BiquadSection::ClearState() {
-    x1L = x2L = x1R = x2R = 0.0;
-    y1L = y2L = y1R = y2R = 0.0;
-}
-
 void DesignLowPass(BiquadSection& s, int sampleRate, int frequency) {
     const double w = kTwoPi * frequency / sampleRate;
     const double sn = std::sin(w), c = std::cos(w);

@@ -19,8 +19,6 @@ struct BiquadSection {
 
     // b0 = 1, everything else 0: the input passes unchanged.
     void SetBypass();
-    // Zeroes the eight states; coefficients stay.
-    void ClearState();
 };
 
 // Low-pass and high-pass at Q 0.5 (no resonant peak) for integer frequency and rate in Hz.

@@ -34,11 +34,6 @@ struct HistoryRing {
     }
     // Copies count samples, oldest first, starting with the one pushed `age` samples before the newest.
     void CopyOut(int32_t age, int32_t count_, float* dst) const;
-    // The sample pushed `age` samples before the newest (age 0 is the newest).
-    float Back(int32_t age) const {
-        const float* p = write - 1 - age;
-        return p < start ? *(p + count) : *p;
-    }
 };
 
 struct ConvPartition {

@@ -5,6 +5,7 @@
 #include <cstring>
 #include <vector>
 
+#include "engine/EngineProbe.h"
 #include "filter/CoreState.h"
 #include "filter/ReverbCore.h"
 #include "platform/Thread.h"
@@ -35,15 +36,15 @@ TEST(CoreParameters, ClampAndApply) {
     ReverbCore c;
     c.setValue(kDamping, 500);
     EXPECT_EQ(c.getValue(kDamping), 99);
-    EXPECT_EQ(c.engineForInspection().damping, 99);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).damping(), 99);
     c.setValue(kEarlyReflections, -600);
-    EXPECT_EQ(c.engineForInspection().earlyGain, 0.0);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).earlyGain(), 0.0);
     c.setValue(kEarlyReflections, -599);
-    EXPECT_DOUBLE_EQ(c.engineForInspection().earlyGain, std::pow(10.0, -2.995));
+    EXPECT_DOUBLE_EQ(EngineProbe(c.engineForInspection()).earlyGain(), std::pow(10.0, -2.995));
     c.setValue(kNotchQ, 25);
-    EXPECT_DOUBLE_EQ(c.engineForInspection().notchQ, 2.5);
+    EXPECT_DOUBLE_EQ(EngineProbe(c.engineForInspection()).notchQ(), 2.5);
     c.setValue(kMeterSource, 2);
-    EXPECT_EQ(c.engineForInspection().meterSource, 2);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).meterSource(), 2);
 }
 
 TEST(CoreParameters, UnknownIdsAreRejectedWithoutEffect) {
@@ -67,15 +68,15 @@ TEST(CoreParameters, UnknownIdsAreRejectedWithoutEffect) {
 
 TEST(CoreParameters, NothingReachesTheEngineBeforeTheFirstApply) {
     ReverbCore c;
-    EXPECT_EQ(c.engineForInspection().mode, -1);
-    EXPECT_EQ(c.engineForInspection().diffusion, -1);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).mode(), -1);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).diffusion(), -1);
     c.applyAll();
-    const ReverbEngine& e = c.engineForInspection();
-    EXPECT_EQ(e.mode, 2);
-    EXPECT_EQ(e.sampleRate, 44100);
-    EXPECT_EQ(e.roomSize, 46);
-    EXPECT_EQ(e.meterSource, 1);
-    EXPECT_EQ(e.rebuildCount, 1);  // the algorithm comes after every value it depends on
+    const EngineProbe e(c.engineForInspection());
+    EXPECT_EQ(e.mode(), 2);
+    EXPECT_EQ(e.sampleRate(), 44100);
+    EXPECT_EQ(e.roomSize(), 46);
+    EXPECT_EQ(e.meterSource(), 1);
+    EXPECT_EQ(e.rebuildCount(), 1);  // the algorithm comes after every value it depends on
 }
 
 TEST(CoreParameters, TextEntryGoesThroughTheTypedUnits) {
@@ -115,7 +116,7 @@ TEST(AlgorithmSwitch, LoadsTheRowAndClampsIt) {
     EXPECT_EQ(c.getValue(kAlgorithm), 7);
     EXPECT_EQ(c.getValue(kDamping), 99);
     EXPECT_EQ(c.getValue(kRoomSize), 62);
-    EXPECT_EQ(c.engineForInspection().mode, 7);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).mode(), 7);
     c.setValue(kAlgorithm, 12);
     EXPECT_EQ(c.getValue(kAlgorithm), 7);  // clamped
 }
@@ -142,7 +143,7 @@ TEST(AlgorithmSwitch, PositionOnlyChangesTheMode) {
     c.setNormalized(kAlgorithm, 1.0f);
     EXPECT_EQ(c.getValue(kAlgorithm), 7);
     EXPECT_EQ(c.getValue(kDamping), 30);  // no row was loaded
-    EXPECT_EQ(c.engineForInspection().mode, 7);
+    EXPECT_EQ(EngineProbe(c.engineForInspection()).mode(), 7);
 }
 
 TEST(CoreStatus, LoadFigureStoppedFlagAndLevel) {

@@ -5,6 +5,7 @@
 #include <cmath>
 
 #include "FilterRig.h"
+#include "engine/EngineProbe.h"
 
 using namespace ulvetta;
 using namespace ulvetta::dshow;
@@ -152,5 +153,5 @@ TEST(Streaming, StateChangesConnectionsAndTheOfferedType) {
     EXPECT_EQ(rig.filter->GetMediaType(-1, &offered), E_INVALIDARG);
     // The copy is taken downstream and the stream runs as float.
     ASSERT_EQ(rig.filter->GetPin(1)->Connect(&rig.downstream, nullptr), S_OK);
-    EXPECT_EQ(rig.filter->Control().GetCore()->engineForInspection().sampleRate, 48000);
+    EXPECT_EQ(EngineProbe(rig.filter->Control().GetCore()->engineForInspection()).sampleRate(), 48000);
 }

@@ -1,26 +1,16 @@
+// The response rate converter: its phase and gain at twice the rate, channels converted independently
+// on one buffer, rows derived on use equal to the table, and its capacity.
 #include <gtest/gtest.h>
 
 #include <cmath>
 #include <vector>
 
+#include "dsp/EngineTestSupport.h"
 #include "engine/IrResampler.h"
-#include "processing/BiquadSection.h"
 
 using namespace ulvetta;
 
 namespace {
-
-// Interleaved stereo test signal: a fixed pseudo-random sequence on the left, a sine on the right.
-std::vector<float> interleaved(int frames) {
-    std::vector<float> v(2 * frames);
-    uint32_t s = 12345;
-    for (int i = 0; i < frames; ++i) {
-        s = s * 1664525u + 1013904223u;
-        v[2 * i] = static_cast<float>((s >> 8) / 8388608.0 - 1.0);
-        v[2 * i + 1] = static_cast<float>(0.5 * std::sin(i * 0.05));
-    }
-    return v;
-}
 
 std::vector<float> convertChannel(const std::vector<float>& in, int channel, int rate, int64_t tableLimit = 8192) {
     const int frames = static_cast<int>(in.size() / 2);
@@ -35,69 +25,7 @@ std::vector<float> convertChannel(const std::vector<float>& in, int channel, int
     return mono;
 }
 
-// Share of the energy above 23 kHz, through four cascaded high-pass sections.
-double shareAbove23k(const std::vector<float>& x, int rate) {
-    std::vector<float> y = x;
-    for (int k = 0; k < 4; ++k) {
-        BiquadSection s;
-        DesignHighPass(s, rate, 23000);
-        ProcessMono(s, y.data(), static_cast<int>(y.size()));
-    }
-    double all = 0.0, high = 0.0;
-    for (size_t i = 0; i < x.size(); ++i) {
-        all += double(x[i]) * x[i];
-        high += double(y[i]) * y[i];
-    }
-    return high / all;
-}
-
 }  // namespace
-
-TEST(IrResampler, RatiosAndTaps) {
-    IrResampler r;
-    struct {
-        int rate;
-        int64_t L, M;
-    } cases[] = {{48000, 160, 147}, {22050, 1, 2}, {96000, 320, 147}, {32000, 320, 441}, {44101, 44101, 44100},
-                 {768000, 2560, 147}};
-    for (auto c : cases) {
-        r.Setup(c.rate);
-        EXPECT_EQ(r.upFactor(), c.L) << c.rate;
-        EXPECT_EQ(r.downFactor(), c.M) << c.rate;
-        EXPECT_EQ(r.taps(), 60);
-    }
-}
-
-TEST(IrResampler, CutoffStaysBelowTheStoredNyquist) {
-    IrResampler r;
-    r.Setup(22050);
-    EXPECT_DOUBLE_EQ(r.cutoff(), 0.5 * 22050 - 89);
-    r.Setup(44100);
-    EXPECT_DOUBLE_EQ(r.cutoff(), 22050 - 89);
-    r.Setup(192000);
-    EXPECT_DOUBLE_EQ(r.cutoff(), 22050 - 89);
-    // Converting up adds no images: the stored data has nothing above 22.05 kHz, and neither has the result.
-    const std::vector<float> in = interleaved(44100);
-    for (int rate : {96000, 192000}) EXPECT_LT(shareAbove23k(convertChannel(in, 0, rate), rate), 0.02) << rate;
-}
-
-TEST(IrResampler, LengthsFollowTheRate) {
-    const std::vector<float> in = interleaved(135168);
-    const size_t n48 = convertChannel(in, 0, 48000).size();
-    EXPECT_NEAR(static_cast<double>(n48), 135168.0 * 48000 / 44100, 2.0);  // about 147120
-    EXPECT_NEAR(static_cast<double>(convertChannel(in, 0, 22050).size()), 135168 / 2.0, 1.0);
-}
-
-TEST(IrResampler, KeepsTheLevelOfASlowSignal) {
-    // A slow sine passes at the converter's gain of 0.9 at any rate.
-    const std::vector<float> in = interleaved(20000);
-    for (int rate : {22050, 48000, 88200}) {
-        const std::vector<float> out = convertChannel(in, 1, rate);
-        float peak = 0.0f;
-        for (size_t i = out.size() / 4; i < out.size(); ++i) peak = std::max(peak, std::fabs(out[i]));
-        EXPECT_NEAR(peak, 0.45, 0.01) << rate;
-    }
-}
 
 TEST(IrResampler, HalfwayPhaseAt88200) {
     // L = 2, M = 1: output 2k lands on input k - 29 (the kernel's centre), output 2k + 1 halfway between
@@ -113,7 +41,7 @@ TEST(IrResampler, HalfwayPhaseAt88200) {
 }
 
 TEST(IrResampler, ChannelsConvertIndependentlyOnOneBuffer) {
-    const std::vector<float> in = interleaved(5000);
+    const std::vector<float> in = test::Noise(5000, 1.0f, 12345);
     IrResampler left, right;
     left.Setup(48000);
     right.Setup(48000);
@@ -122,14 +50,11 @@ TEST(IrResampler, ChannelsConvertIndependentlyOnOneBuffer) {
     const int nr = right.Run(out.data() + 1, in.data() + 1, 5000, 6000);
     ASSERT_EQ(nl, nr);
     const std::vector<float> l = convertChannel(in, 0, 48000), r = convertChannel(in, 1, 48000);
-    for (int i = 0; i < nl; ++i) {
-        ASSERT_EQ(out[2 * i], l[i]);
-        ASSERT_EQ(out[2 * i + 1], r[i]);
-    }
+    for (int i = 0; i < nl; ++i) ASSERT_TRUE(out[2 * i] == l[i] && out[2 * i + 1] == r[i]) << i;
 }
 
 TEST(IrResampler, RowsDerivedOnUseEqualTheTable) {
-    const std::vector<float> in = interleaved(3000);
+    const std::vector<float> in = test::Noise(3000, 1.0f, 12345);
     for (int rate : {48000, 44101}) {
         const std::vector<float> table = convertChannel(in, 0, rate, 1 << 20);
         const std::vector<float> derived = convertChannel(in, 0, rate, 0);
@@ -138,7 +63,7 @@ TEST(IrResampler, RowsDerivedOnUseEqualTheTable) {
 }
 
 TEST(IrResampler, NeverWritesPastItsCapacity) {
-    const std::vector<float> in = interleaved(1000);
+    const std::vector<float> in = test::Noise(1000, 1.0f, 12345);
     IrResampler r;
     r.Setup(96000);
     std::vector<float> out(2 * 100 + 2, 7.0f);

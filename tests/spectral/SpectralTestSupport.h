@@ -1,5 +1,5 @@
-// Helpers of the spectral tests: seeded random data, a direct DFT in double precision, the instruction
-// sets to run each check on, and an error handler that records what the library reports.
+// Helpers of the spectral tests: seeded random data, the unit circle for direct transforms in double
+// precision, the RCPerm layout, and the instruction sets to run each check on.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -7,7 +7,6 @@
 #include <cmath>
 #include <cstdlib>
 #include <random>
-#include <string>
 #include <vector>
 
 #include "spectral/FftTables.h"
@@ -17,7 +16,7 @@ namespace spectral_test {
 
 constexpr double kEps = 5.9604644775390625e-08;  // 2^-24, float rounding unit
 
-// Seed from SPECTRAL_SEED when set, so a failing run can be repeated.
+// Seed from SPECTRAL_SEED when set, so that a failing run can be repeated.
 inline unsigned seed(unsigned fallback) {
     const char* s = std::getenv("SPECTRAL_SEED");
     return s ? static_cast<unsigned>(std::strtoul(s, nullptr, 10)) : fallback;
@@ -35,38 +34,19 @@ inline std::vector<float> randomFloats(std::size_t n, unsigned s, float lo = -1.
 struct UnitCircle {
     std::vector<double> c, s;
     explicit UnitCircle(std::size_t n) : c(n), s(n) {
-        const long double pi = 3.141592653589793238462643383279502884L;
         for (std::size_t j = 0; j < n; ++j) {
-            const long double a = 2.0L * pi * static_cast<long double>(j) / static_cast<long double>(n);
+            const long double a = 6.283185307179586476925286766559L * j / n;
             c[j] = static_cast<double>(std::cos(a));
             s[j] = static_cast<double>(std::sin(a));
         }
     }
 };
 
-// X[k] = sum_n x[n] e^(-2 pi i n k / N), directly.
-inline void dftBin(const std::vector<float>& x, const UnitCircle& u, std::size_t k, double& re, double& im) {
-    const std::size_t n = x.size();
-    re = 0.0;
-    im = 0.0;
-    for (std::size_t j = 0; j < n; ++j) {
-        const std::size_t e = (j * k) % n;
-        re += double(x[j]) * u.c[e];
-        im -= double(x[j]) * u.s[e];
-    }
-}
-
 // Real and imaginary part of bin k (0 <= k <= N/2) of a spectrum stored in RCPerm.
-inline float permRe(const float* spectrum, std::size_t n, std::size_t k) {
-    if (n == 1) return spectrum[0];
-    if (k == 0) return spectrum[0];
-    if (k == n / 2) return spectrum[1];
-    return spectrum[2 * k];
+inline float permRe(const float* x, std::size_t n, std::size_t k) {
+    return k == 0 ? x[0] : k == n / 2 ? x[1] : x[2 * k];
 }
-inline float permIm(const float* spectrum, std::size_t n, std::size_t k) {
-    if (k == 0 || k == n / 2) return 0.0f;
-    return spectrum[2 * k + 1];
-}
+inline float permIm(const float* x, std::size_t n, std::size_t k) { return k == 0 || k == n / 2 ? 0.0f : x[2 * k + 1]; }
 
 // The instruction sets this build and processor can run.
 inline std::vector<ulvetta::spectral::Isa> availableIsas() {
@@ -77,14 +57,6 @@ inline std::vector<ulvetta::spectral::Isa> availableIsas() {
         if (ulvetta::spectral::selectIsa(i)) out.push_back(i);
     ulvetta::spectral::selectIsa(before);
     return out;
-}
-
-inline const char* isaName(ulvetta::spectral::Isa i) {
-    switch (i) {
-    case ulvetta::spectral::Isa::Scalar: return "scalar";
-    case ulvetta::spectral::Isa::Sse2: return "sse2";
-    default: return "avx2";
-    }
 }
 
 // Selects an instruction set for one scope and restores the previous one.
@@ -99,46 +71,6 @@ public:
 private:
     ulvetta::spectral::Isa before_;
     bool ok_;
-};
-
-// Records every report while installed; restores the previous handler and clears the status afterwards.
-struct Reported {
-    int calls = 0;
-    int status = 0;
-    std::string routine, message;
-};
-
-class CaptureErrors {
-public:
-    CaptureErrors() {
-        last() = Reported{};
-        previous_ = ulvetta::nspRedirectError(&record);
-        ulvetta::nspSetErrStatus(ulvetta::NspStsOk);
-    }
-    ~CaptureErrors() {
-        ulvetta::nspRedirectError(previous_);
-        ulvetta::nspSetErrStatus(ulvetta::NspStsOk);
-    }
-    static Reported& last() {
-        static Reported r;
-        return r;
-    }
-    // Returns what was reported since the last take() and starts afresh.
-    Reported take() {
-        Reported r = last();
-        last() = Reported{};
-        return r;
-    }
-
-private:
-    static void record(int status, const char* routine, const char* message) {
-        Reported& r = last();
-        ++r.calls;
-        r.status = status;
-        r.routine = routine ? routine : "";
-        r.message = message ? message : "";
-    }
-    ulvetta::NspErrorHandler previous_;
 };
 
 }  // namespace spectral_test

@@ -6,7 +6,7 @@
 #include <cmath>
 #include <cstring>
 
-#include "processing/BlockFrame.h"
+#include "engine/kernels/BlockFrame.h"
 
 namespace ulvetta {
 
@@ -32,16 +32,26 @@ void ReverbEngine::cleanSmoothState() {
         if (exponentIsZero(s)) s = 0.0f;
 }
 
-void ReverbEngine::latchFlush(int flush, bool preDelayInPath) {
+void ReverbEngine::latchEndOfStream(int flush, EndOfStream rule) {
+    if (rule == EndOfStream::ResponseLength) {
+        // The tail is the response's length after the last input frame, counted from the first flush block.
+        if (flush && !flushLatched) {
+            flushLatched = true;
+            tailCountdown = std::max(0, irLength - 1);
+        }
+        return;
+    }
     if (!flushLatched) flushLatched = (flush != 0);
     if (!flushLatched) return;
     // A line out of the signal path is never written again, so whatever it still holds (from before
     // "Pre Delay" went to 0, or from the echo of another mode) would hold the tail open forever.
-    bool silent = true;
+    const bool preDelayInPath =
+        rule == EndOfStream::PreDelayAlways || (rule == EndOfStream::PreDelayWhenOn && preDelayOn);
     if (!preDelayInPath) {
         tailTrimArmed = true;
         return;
     }
+    bool silent = true;
     for (int32_t i = 0; i < preDelayLine.length && silent; ++i) {
         const double v = preDelayLine.samples[i];
         silent = (v >= -kTiny && v <= kTiny);
@@ -137,8 +147,10 @@ void ReverbEngine::finishMeter() {
     cleanSmoothState();
 }
 
+// The colour states (the second is the echo's right channel) and the two damping states.
 void ReverbEngine::flushKernelStates() {
     colourState = flushTiny(colourState);
+    colourState2 = flushTiny(colourState2);
     dampingStateLeft = flushTiny(dampingStateLeft);
     dampingStateRight = flushTiny(dampingStateRight);
 }
@@ -150,6 +162,13 @@ int ReverbEngine::trimmedLength(const float* outLeft, const float* outRight, int
         if (l < -kTiny || l > kTiny || r < -kTiny || r > kTiny) return i + 1;
     }
     return 0;
+}
+
+int ReverbEngine::countedLength(int frames, int flush) {
+    if (!flush) return frames;
+    const int produced = std::min(frames, tailCountdown);
+    tailCountdown -= produced;
+    return produced;
 }
 
 int ReverbEngine::ProcessBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
@@ -169,16 +188,25 @@ int ReverbEngine::ProcessBlock(float* outLeft, float* outRight, const float* inL
     }
 }
 
+namespace {
+// A mode whose network does not exist (yet) passes the dry signal; nothing in a line holds the tail.
+struct DryBlock {
+    static constexpr bool kMeterBeforeLatch = false;
+    static constexpr EndOfStream kEnd = EndOfStream::PreDelayNever;
+    static constexpr InputStage kInput = InputStage::None;
+    static constexpr bool kFlushNetworkStates = false;
+};
+}  // namespace
+
 int ReverbEngine::processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                              int frames, int stride, int accumulate, int flush) {
-    latchFlush(flush, false);
-    if (frames <= 0) return 0;
-    decayMeter(frames);
-    if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    startMeter();
+    return RunBlock<DryBlock, &ReverbEngine::dryFrames>(outLeft, outRight, inLeft, inRight, frames, stride,
+                                                        accumulate, flush);
+}
+
+ULVETTA_ALWAYS_INLINE void ReverbEngine::dryFrames(float* outLeft, float* outRight, const float* inLeft,
+                                                   const float* inRight, int frames, int stride, int accumulate) {
     for (int i = 0; i < frames; ++i) mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, 0.0, 0.0);
-    finishMeter();
-    return trimmedLength(outLeft, outRight, frames, stride);
 }
 
 }  // namespace ulvetta

@@ -1,7 +1,7 @@
 // The twenty-line plates (modes 2 and 6): the plate tank with combs and plain delays hung off both halves,
 // read through six more taps per side for a denser echo. Mode 2 sums all taps with weight 1; mode 6 weights
 // them for a swelling, "reversed" envelope. Runs on the streaming thread under the core's lock.
-#include "processing/PlateNetwork.h"
+#include "engine/kernels/PlateNetwork.h"
 
 namespace ulvetta {
 
@@ -16,19 +16,27 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
     return runExtendedPlate<Reads::Checked>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
 }
 
+namespace {
+// These plates meter before latching the flush flag; the pre-delay line holds the tail while it is on.
+struct ExtendedPlateBlock {
+    static constexpr bool kMeterBeforeLatch = true;
+    static constexpr EndOfStream kEnd = EndOfStream::PreDelayWhenOn;
+    static constexpr InputStage kInput = InputStage::Mono;
+    static constexpr bool kFlushNetworkStates = true;
+};
+}  // namespace
+
 template <Reads kReads>
 int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                    int frames, int stride, int accumulate, int flush) {
-    // These plates meter before latching the flush flag.
-    if (frames > 0) {
-        decayMeter(frames);
-        if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    }
-    latchFlush(flush, preDelayOn);
-    if (frames <= 0) return 0;
-    makeMono(inLeft, inRight, frames, stride);
-    filterMono(frames);
+    constexpr KernelFrames kFrames = &ReverbEngine::extendedPlateFrames<kReads>;
+    return RunBlock<ExtendedPlateBlock, kFrames>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+}
 
+template <Reads kReads>
+ULVETTA_ALWAYS_INLINE void ReverbEngine::extendedPlateFrames(float* outLeft, float* outRight, const float* inLeft,
+                                                             const float* inRight, int frames, int stride,
+                                                             int accumulate) {
     NetworkViews v;
     v.Load(*this, 20, 20, true);
     RunLine* lines = v.runs.lines;
@@ -39,7 +47,6 @@ int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float*
     const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef;
     double dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
-    startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
@@ -79,9 +86,6 @@ int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float*
     front.Store(*this, preDelayLine);
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
-    finishMeter();
-    flushKernelStates();
-    return trimmedLength(outLeft, outRight, frames, stride);
 }
 
 }  // namespace ulvetta

@@ -1,6 +1,7 @@
-// Per-frame pieces of the block frame that every kernel calls inside its sample loop, defined inline so
-// that they compile into the kernels' loops: the meter smoother, the wet/dry mix with the wet meter, and
-// the guard against non-finite input.
+// The block frame around every kernel: the driver that runs the steps common to all of them before and
+// after the kernel's frames (RunBlock, shaped by the kernel's BlockPolicy), and the per-frame pieces the
+// kernels call inside their loops (meter smoother, wet/dry mix with the wet meter, guard against
+// non-finite input), defined inline so that they compile into those loops.
 #pragma once
 
 #include <algorithm>
@@ -55,6 +56,43 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::mixOutput(float* outLeft, float* outRig
         // The output as stored (a sum when accumulating; the later channel when both are one buffer).
         meterPeak_ = std::max(meterPeak_, smooth(std::max(std::fabs(outLeft[at]), std::fabs(outRight[at]))));
     }
+}
+
+ULVETTA_ALWAYS_INLINE void ReverbEngine::makeStereo(const float* inLeft, const float* inRight, int frames,
+                                                    int stride) {
+    float* scratch = growScratch(2 * frames);
+    const float gain = static_cast<float>(inputGain);
+    for (int i = 0; i < frames; ++i) {
+        const float l = inLeft[i * stride], r = inRight[i * stride];
+        scratch[2 * i] = (std::isfinite(l) ? l : 0.0f) * gain;
+        scratch[2 * i + 1] = (std::isfinite(r) ? r : 0.0f) * gain;
+    }
+}
+
+// One block: the end-of-stream latch, the meter decay and the input meter (in the order the policy states),
+// the input stage, the kernel's frames (kFrames writes every output frame), the block's meter and the
+// network's denormal clean-up, then the number of frames that carry signal.
+template <class Policy, ReverbEngine::KernelFrames kFrames>
+ULVETTA_ALWAYS_INLINE int ReverbEngine::RunBlock(float* outLeft, float* outRight, const float* inLeft,
+                                                 const float* inRight, int frames, int stride, int accumulate,
+                                                 int flush) {
+    if (Policy::kMeterBeforeLatch && frames > 0) meterBlockInput(inLeft, inRight, frames, stride);
+    latchEndOfStream(flush, Policy::kEnd);
+    if (frames <= 0) return 0;
+    if (!Policy::kMeterBeforeLatch) meterBlockInput(inLeft, inRight, frames, stride);
+    if (Policy::kInput == InputStage::Mono) {
+        makeMono(inLeft, inRight, frames, stride);
+        filterMono(frames);
+    } else if (Policy::kInput == InputStage::Stereo) {
+        makeStereo(inLeft, inRight, frames, stride);
+        filterStereo(monoBuffer.get(), frames);
+    }
+    startMeter();
+    (this->*kFrames)(outLeft, outRight, inLeft, inRight, frames, stride, accumulate);
+    finishMeter();
+    if (Policy::kFlushNetworkStates) flushKernelStates();
+    if (Policy::kEnd == EndOfStream::ResponseLength) return countedLength(frames, flush);
+    return trimmedLength(outLeft, outRight, frames, stride);
 }
 
 }  // namespace ulvetta

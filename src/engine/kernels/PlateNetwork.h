@@ -7,7 +7,7 @@
 
 #include "engine/NetworkTables.h"
 #include "engine/ReverbEngine.h"
-#include "processing/BlockFrame.h"
+#include "engine/kernels/BlockFrame.h"
 #include "processing/DelayElements.h"
 
 namespace ulvetta {

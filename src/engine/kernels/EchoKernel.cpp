@@ -2,9 +2,7 @@
 // left/right frames. Each repeat is darkened by the colour low-pass, fed back with a 0.4 cross-feed between
 // the channels, and the sum of both channels drives the plate tank. The input stage stays stereo. Runs on
 // the streaming thread under the core's lock.
-#include <cmath>
-
-#include "processing/PlateNetwork.h"
+#include "engine/kernels/PlateNetwork.h"
 
 namespace ulvetta {
 
@@ -23,27 +21,28 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
     return runEcho<Reads::Checked>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
 }
 
+namespace {
+// The echo meters before latching the flush flag; its memory, the pre-delay line, is always in the path.
+// The input stage stays stereo: gain, then the three filter sections with a state per channel.
+struct EchoBlock {
+    static constexpr bool kMeterBeforeLatch = true;
+    static constexpr EndOfStream kEnd = EndOfStream::PreDelayAlways;
+    static constexpr InputStage kInput = InputStage::Stereo;
+    static constexpr bool kFlushNetworkStates = true;
+};
+}  // namespace
+
 template <Reads kReads>
 int ReverbEngine::runEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                           int stride, int accumulate, int flush) {
-    // The echo meters before latching the flush flag.
-    if (frames > 0) {
-        decayMeter(frames);
-        if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    }
-    latchFlush(flush, true);
-    if (frames <= 0) return 0;
+    return RunBlock<EchoBlock, &ReverbEngine::echoFrames<kReads>>(outLeft, outRight, inLeft, inRight, frames,
+                                                                  stride, accumulate, flush);
+}
 
-    // Stereo input stage: gain, then the three filter sections with a state per channel.
-    float* scratch = growScratch(2 * frames);
-    const float gain = static_cast<float>(inputGain);
-    for (int i = 0; i < frames; ++i) {
-        const float l = inLeft[i * stride], r = inRight[i * stride];
-        scratch[2 * i] = (std::isfinite(l) ? l : 0.0f) * gain;
-        scratch[2 * i + 1] = (std::isfinite(r) ? r : 0.0f) * gain;
-    }
-    filterStereo(scratch, frames);
-
+template <Reads kReads>
+ULVETTA_ALWAYS_INLINE void ReverbEngine::echoFrames(float* outLeft, float* outRight, const float* inLeft,
+                                                    const float* inRight, int frames, int stride, int accumulate) {
+    const float* scratch = monoBuffer.get();  // the filtered input, interleaved
     NetworkViews v;
     v.Load(*this, 12, 14, false);
     RunLine* lines = v.runs.lines;
@@ -53,7 +52,6 @@ int ReverbEngine::runEcho(float* outLeft, float* outRight, const float* inLeft, 
     const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef, feedback = echoFeedback;
     const double cutoff = colourCutoff;
     double colourL = colourState, colourR = colourState2, dampLeft = dampingStateLeft, dampRight = dampingStateRight;
-    startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
@@ -85,10 +83,6 @@ int ReverbEngine::runEcho(float* outLeft, float* outRight, const float* inLeft, 
     colourState2 = colourR;
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
-    finishMeter();
-    flushKernelStates();
-    colourState2 = flushTiny(colourState2);
-    return trimmedLength(outLeft, outRight, frames, stride);
 }
 
 }  // namespace ulvetta

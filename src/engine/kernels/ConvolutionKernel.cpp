@@ -6,7 +6,7 @@
 #include <cmath>
 
 #include "engine/ReverbEngine.h"
-#include "processing/BlockFrame.h"
+#include "engine/kernels/BlockFrame.h"
 
 namespace ulvetta {
 
@@ -24,21 +24,27 @@ inline double sectionStep(BiquadSection& s, double x) {
 
 constexpr int32_t kWorkerPartition = 4096;
 
+// The convolution meters before latching the flush flag, runs its own input stage per frame (stereo, in
+// double precision), and ends the stream by counting out its response.
+struct ConvolutionBlock {
+    static constexpr bool kMeterBeforeLatch = true;
+    static constexpr EndOfStream kEnd = EndOfStream::ResponseLength;
+    static constexpr InputStage kInput = InputStage::None;
+    static constexpr bool kFlushNetworkStates = false;
+};
+
 }  // namespace
 
 int ReverbEngine::processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                      int frames, int stride, int accumulate, int flush) {
-    if (frames > 0) {
-        decayMeter(frames);
-        if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    }
-    if (flush && !flushLatched) {
-        flushLatched = true;
-        tailCountdown = std::max(0, irLength - 1);
-    }
-    if (frames <= 0) return 0;
+    return RunBlock<ConvolutionBlock, &ReverbEngine::convolutionFrames>(outLeft, outRight, inLeft, inRight, frames,
+                                                                        stride, accumulate, flush);
+}
+
+ULVETTA_ALWAYS_INLINE void ReverbEngine::convolutionFrames(float* outLeft, float* outRight, const float* inLeft,
+                                                           const float* inRight, int frames, int stride,
+                                                           int accumulate) {
     const bool ready = partitions != nullptr && irLeft != nullptr && historyLeft.count > 0;
-    startMeter();
     for (int i = 0; i < frames; ++i) {
         const int at = i * stride;
         double wetLeft = 0.0, wetRight = 0.0;
@@ -107,7 +113,6 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
         // 9-10. Mix with the levels, and the wet meter.
         mixOutput(outLeft, outRight, inLeft, inRight, i, stride, accumulate, wetLeft, wetRight, wetLevel, dryLevel);
     }
-    finishMeter();
     // Keep denormals out of the recursive states.
     colourState = flushTiny(colourState);
     for (int s = 0; s < 3; ++s) {
@@ -117,10 +122,6 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
         f.y1L = flushTiny(f.y1L);
         f.y2L = flushTiny(f.y2L);
     }
-    if (!flush) return frames;
-    const int produced = std::min(frames, tailCountdown);
-    tailCountdown -= produced;
-    return produced;
 }
 
 }  // namespace ulvetta

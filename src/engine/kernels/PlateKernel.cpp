@@ -2,7 +2,7 @@
 // coloured, pre-delayed and diffused mono input, with seven output taps per side plus an early-reflection
 // path per side. Runs on the streaming thread under the core's lock; allocation-free.
 #include "engine/NetworkTables.h"
-#include "processing/PlateNetwork.h"
+#include "engine/kernels/PlateNetwork.h"
 
 namespace ulvetta {
 
@@ -39,16 +39,26 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
                                                     accumulate, flush);
 }
 
+namespace {
+// The flush latch comes first; the pre-delay line holds the tail while "Pre Delay" is on.
+struct PlateBlock {
+    static constexpr bool kMeterBeforeLatch = false;
+    static constexpr EndOfStream kEnd = EndOfStream::PreDelayWhenOn;
+    static constexpr InputStage kInput = InputStage::Mono;
+    static constexpr bool kFlushNetworkStates = true;
+};
+}  // namespace
+
 template <Reads kDiffusers, Reads kTank>
 int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                            int stride, int accumulate, int flush) {
-    latchFlush(flush, preDelayOn);
-    if (frames <= 0) return 0;
-    decayMeter(frames);
-    if (meterSource == 0) meterInput(inLeft, inRight, frames, stride);
-    makeMono(inLeft, inRight, frames, stride);
-    filterMono(frames);
+    constexpr KernelFrames kFrames = &ReverbEngine::plateFrames<kDiffusers, kTank>;
+    return RunBlock<PlateBlock, kFrames>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+}
 
+template <Reads kDiffusers, Reads kTank>
+ULVETTA_ALWAYS_INLINE void ReverbEngine::plateFrames(float* outLeft, float* outRight, const float* inLeft,
+                                                     const float* inRight, int frames, int stride, int accumulate) {
     NetworkViews v;
     v.Load(*this, 12, 14, true);
     RunLine* lines = v.runs.lines;
@@ -57,7 +67,6 @@ int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft,
     const double dc = diffusionCoef, decayK = decayCoef, dampK = dampingCoef;
     double dampLeft = dampingStateLeft, dampRight = dampingStateRight;
     const float* mono = monoBuffer.get();
-    startMeter();
     for (int i = 0; i < frames;) {
         const int run = v.runs.Begin(frames - i);
         for (int j = 0; j < run; ++j, ++i) {
@@ -80,9 +89,6 @@ int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft,
     front.Store(*this, preDelayLine);
     dampingStateLeft = dampLeft;
     dampingStateRight = dampRight;
-    finishMeter();
-    flushKernelStates();
-    return trimmedLength(outLeft, outRight, frames, stride);
 }
 
 }  // namespace ulvetta
