@@ -235,9 +235,9 @@ HRESULT ReverbFilter::StopStreaming() {
 
 void ReverbFilter::ApplyAutomationValue(int32_t id, float value) {
     ReverbCore* core = control_->GetCore();
-    ParamDesc d;
-    if (!core->getParamDesc(id, d)) return;
-    if (d.automationType == 2 || d.automationType == 3)
+    const ParamDesc* d = findParam(id);
+    if (d == nullptr) return;
+    if (d->automationType == 2 || d->automationType == 3)
         core->setValue(id, static_cast<int32_t>(value));
     else
         core->setNormalized(id, value);
@@ -498,8 +498,9 @@ STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
     if (info == nullptr) return E_POINTER;
     CritSecLock g(paramLock_);
     ReverbCore* core = control_->GetCore();
-    ParamDesc d;
-    if (!core->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
+    const ParamDesc* found = findParam(static_cast<int32_t>(index));
+    if (found == nullptr) return E_INVALIDARG;
+    const ParamDesc& d = *found;
     std::memset(info, 0, sizeof *info);
     if (d.automationType == 2) {
         info->mpType = MPT_BOOL;
@@ -520,8 +521,8 @@ STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
         info->mpdMaxValue = 1.0f;
         info->mpdNeutralValue = core->getNormalized(d.id);
     }
-    AnsiToWide(d.name.c_str(), info->szLabel, 32);
-    AnsiToWide((d.automationType == 2 || d.automationType == 3) ? d.label.c_str() : "", info->szUnitText, 32);
+    AnsiToWide(d.name, info->szLabel, 32);
+    AnsiToWide((d.automationType == 2 || d.automationType == 3) ? d.label : "", info->szUnitText, 32);
     return S_OK;
 }
 
@@ -529,8 +530,9 @@ STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (text == nullptr) return E_POINTER;
     CritSecLock g(paramLock_);
-    ParamDesc d;
-    if (!control_->GetCore()->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
+    const ParamDesc* found = findParam(static_cast<int32_t>(index));
+    if (found == nullptr) return E_INVALIDARG;
+    const ParamDesc& d = *found;
     constexpr int kChars = 256;  // a 512-byte block
     auto* block = static_cast<WCHAR*>(CoTaskMemAlloc(kChars * sizeof(WCHAR)));
     if (block == nullptr) return E_OUTOFMEMORY;
@@ -543,8 +545,6 @@ STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
     };
     append(d.name);
     append((d.automationType == 2 || d.automationType == 3) ? d.label : std::string());
-    if (d.automationType == 3)
-        for (const SkinString& n : d.valueNames) append(n);
     *text = block;
     return S_OK;
 }
@@ -573,10 +573,10 @@ STDMETHODIMP ReverbFilter::GetParam(DWORD index, MP_DATA* value) {
     if (index >= kMediaParamCount) return E_INVALIDARG;
     if (value == nullptr) return E_POINTER;
     ReverbCore* core = control_->GetCore();
-    ParamDesc d;
-    if (!core->getParamDesc(static_cast<int32_t>(index), d)) return E_INVALIDARG;
-    *value = (d.automationType == 2 || d.automationType == 3) ? static_cast<MP_DATA>(d.value)
-                                                              : static_cast<MP_DATA>(d.getNormalized());
+    const ParamDesc* d = findParam(static_cast<int32_t>(index));
+    if (d == nullptr) return E_INVALIDARG;
+    *value = (d->automationType == 2 || d->automationType == 3) ? static_cast<MP_DATA>(core->getValue(d->id))
+                                                                : core->getNormalized(d->id);
     return S_OK;
 }
 
