@@ -82,7 +82,9 @@ int32_t valueAtPosition(const ParamDesc& d, float p) {
     return d.minimum + roundSteps(range * x);
 }
 
-int32_t clampValue(const ParamDesc& d, int32_t v) { return v < d.minimum ? d.minimum : (v > d.maximum ? d.maximum : v); }
+int32_t clampValue(const ParamDesc& d, int32_t v) {
+    return v < d.minimum ? d.minimum : (v > d.maximum ? d.maximum : v);
+}
 
 char* formatValue(const ParamDesc& d, int32_t value, bool full, char* out, size_t capacity) {
     if (out == nullptr || capacity == 0) return out;

@@ -56,38 +56,51 @@ struct ParamDesc {
     double scale;  // 10^decimals
 };
 
+// A description from its table row; a taper base of 0 means the linear curve.
 constexpr ParamDesc makeParam(const char* name, int32_t defaultValue, int32_t decimals, int32_t width,
                               int32_t minimum, int32_t maximum, const char* maxText, const char* minText,
-                              int32_t id, Curve curve, int32_t curveBase) {
+                              int32_t id, int32_t curveBase) {
     double scale = 1.0;
     for (int32_t d = 0; d < decimals; ++d) scale *= 10.0;
-    return ParamDesc{name,    "",      decimals, width,    minimum,   maximum,
-                     maxText != nullptr, maxText != nullptr ? maxText : "",
-                     minText != nullptr, minText != nullptr ? minText : "",
-                     id,      curve,   curveBase, 0,       defaultValue, scale};
+    return ParamDesc{name,
+                     "",
+                     decimals,
+                     width,
+                     minimum,
+                     maximum,
+                     maxText != nullptr,
+                     maxText != nullptr ? maxText : "",
+                     minText != nullptr,
+                     minText != nullptr ? minText : "",
+                     id,
+                     curveBase == 0 ? Curve::Linear : Curve::LogTaper,
+                     curveBase,
+                     0,
+                     defaultValue,
+                     scale};
 }
 
 // The 17 descriptions, entry i describing id i.
 inline constexpr ParamDesc kParamTable[kParamCount] = {
     // clang-format off
-    //        name                default dec width  min     max  maxText  minText   id            curve          k
-    makeParam("Diffusion",          100,  0, 3,     0,    100, nullptr, nullptr, kDiffusion,        Curve::Linear,   0),
-    makeParam("Pre Delay",           32,  0, 3,     0,    500, nullptr, nullptr, kPreDelay,         Curve::LogTaper, 10),
-    makeParam("Decay",               47,  0, 3,     0,    100, nullptr, nullptr, kDecay,            Curve::Linear,   0),
-    makeParam("Damping",             30,  0, 2,     0,     99, nullptr, nullptr, kDamping,          Curve::Linear,   0),
-    makeParam("Room Size",           46,  0, 3,     0,    200, nullptr, nullptr, kRoomSize,         Curve::LogTaper, 10),
-    makeParam("Early Reflections",    0,  1, 4,  -600,      0, nullptr, "-Inf.", kEarlyReflections, Curve::Linear,   0),
-    makeParam("Output Level Wet",  -180,  1, 4,  -600,     60, nullptr, "-Inf.", kOutputLevelWet,   Curve::Linear,   0),
-    makeParam("Output Level Dry",     0,  1, 4,  -600,     60, nullptr, "-Inf.", kOutputLevelDry,   Curve::Linear,   0),
-    makeParam("Colour",              56,  0, 3,     1,    100, nullptr, nullptr, kColour,           Curve::LogTaper, 10),
-    makeParam("Input Gain",           0,  1, 4,  -300,    150, nullptr, nullptr, kInputGain,        Curve::Linear,   0),
-    makeParam("Low Pass Freq",    10000,  0, 5,    20,  10000, "Off",   nullptr, kLowPassFreq,      Curve::LogTaper, 1000),
-    makeParam("High Pass Freq",     125,  0, 5,   100,  16000, nullptr, "Off",   kHighPassFreq,     Curve::LogTaper, 1000),
-    makeParam("Notch Freq",        2000,  0, 5,    20,  16000, nullptr, nullptr, kNotchFreq,        Curve::LogTaper, 1000),
-    makeParam("Notch Gain",           0,  1, 3,  -120,    120, nullptr, nullptr, kNotchGain,        Curve::Linear,   0),
-    makeParam("Notch Q",             30,  1, 3,     1,     50, nullptr, nullptr, kNotchQ,           Curve::Linear,   0),
-    makeParam("",                     2,  1, 1,     0,      7, nullptr, nullptr, kAlgorithm,        Curve::Linear,   0),
-    makeParam("",                     1,  0, 3,     0,      2, nullptr, nullptr, kMeterSource,      Curve::Linear,   0),
+    //        name                default dec width  min     max  maxText  minText  id                    k
+    makeParam("Diffusion",          100,  0, 3,     0,    100, nullptr, nullptr, kDiffusion,           0),
+    makeParam("Pre Delay",           32,  0, 3,     0,    500, nullptr, nullptr, kPreDelay,           10),
+    makeParam("Decay",               47,  0, 3,     0,    100, nullptr, nullptr, kDecay,               0),
+    makeParam("Damping",             30,  0, 2,     0,     99, nullptr, nullptr, kDamping,             0),
+    makeParam("Room Size",           46,  0, 3,     0,    200, nullptr, nullptr, kRoomSize,           10),
+    makeParam("Early Reflections",    0,  1, 4,  -600,      0, nullptr, "-Inf.", kEarlyReflections,    0),
+    makeParam("Output Level Wet",  -180,  1, 4,  -600,     60, nullptr, "-Inf.", kOutputLevelWet,      0),
+    makeParam("Output Level Dry",     0,  1, 4,  -600,     60, nullptr, "-Inf.", kOutputLevelDry,      0),
+    makeParam("Colour",              56,  0, 3,     1,    100, nullptr, nullptr, kColour,             10),
+    makeParam("Input Gain",           0,  1, 4,  -300,    150, nullptr, nullptr, kInputGain,           0),
+    makeParam("Low Pass Freq",    10000,  0, 5,    20,  10000, "Off",   nullptr, kLowPassFreq,      1000),
+    makeParam("High Pass Freq",     125,  0, 5,   100,  16000, nullptr, "Off",   kHighPassFreq,     1000),
+    makeParam("Notch Freq",        2000,  0, 5,    20,  16000, nullptr, nullptr, kNotchFreq,        1000),
+    makeParam("Notch Gain",           0,  1, 3,  -120,    120, nullptr, nullptr, kNotchGain,           0),
+    makeParam("Notch Q",             30,  1, 3,     1,     50, nullptr, nullptr, kNotchQ,              0),
+    makeParam("",                     2,  1, 1,     0,      7, nullptr, nullptr, kAlgorithm,           0),
+    makeParam("",                     1,  0, 3,     0,      2, nullptr, nullptr, kMeterSource,         0),
     // clang-format on
 };
 
