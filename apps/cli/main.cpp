@@ -187,7 +187,8 @@ int run(int argc, char** argv) {
     }
     if (!presetNameProblem(name).empty()) throw CliError(presetNameProblem(name));
     std::error_code missing;
-    if (!std::filesystem::is_regular_file(folder.pathOf(name), missing)) failOnPreset(PresetResult::NotFound, name, folder);
+    if (!std::filesystem::is_regular_file(folder.pathOf(name), missing))
+        failOnPreset(PresetResult::NotFound, name, folder);
     failOnPreset(folder.remove(name), name, folder);
     return kExitOk;
 }
