@@ -538,13 +538,13 @@ STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
     if (block == nullptr) return E_OUTOFMEMORY;
     std::memset(block, 0, kChars * sizeof(WCHAR));
     int at = 0;
-    auto append = [&](const std::string& s) {
+    auto append = [&](const char* s) {
         if (at >= kChars - 1) return;
-        AnsiToWide(s.c_str(), block + at, kChars - 1 - at);
+        AnsiToWide(s, block + at, kChars - 1 - at);
         at += static_cast<int>(wcslen(block + at)) + 1;
     };
     append(d.name);
-    append((d.automationType == 2 || d.automationType == 3) ? d.label : std::string());
+    append((d.automationType == 2 || d.automationType == 3) ? d.label : "");
     *text = block;
     return S_OK;
 }
