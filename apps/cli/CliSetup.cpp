@@ -92,11 +92,11 @@ bool parseInteger(const std::string& text, long long minimum, long long maximum,
     return true;
 }
 
-std::string parameterName(ReverbCore& core, int id) {
+std::string parameterName(ReverbCore&, int id) {
     if (id == kAlgorithm) return "Algorithm";
     if (id == kMeterSource) return "Meter Source";
-    ParamDesc d;
-    return core.getParamDesc(id, d) ? d.name : std::string();
+    const ParamDesc* d = findParam(id);
+    return d ? d->name : std::string();
 }
 
 int findParameter(ReverbCore& core, const std::string& name) {
@@ -140,8 +140,8 @@ void applyEdit(ReverbCore& core, const ParamEdit& edit) {
         return;
     }
     std::string text = value;
-    ParamDesc d;
-    core.getParamDesc(id, d);
+    const ParamDesc& d = *findParam(id);
+    char shown[ReverbCore::kTextCapacity];
     if (id == kMeterSource && meterSourceFromWord(value) >= 0) {
         text = std::to_string(meterSourceFromWord(value));
     } else if (!isDecimalNumber(value)) {
@@ -158,9 +158,9 @@ void applyEdit(ReverbCore& core, const ParamEdit& edit) {
             text = stepsAsText(d.maximum, d.decimals);
         else
             throw CliError("malformed value " + inQuotes(value) + " for " + name + "; give a number such as " +
-                           d.formatValue(true));
+                           core.getValueText(id, shown, true));
     }
-    core.setValueText(id, text);
+    core.setValueText(id, text.c_str());
 }
 
 void CoreSetup::attach(CLI::App& app) {

@@ -13,7 +13,9 @@ namespace {
 struct Row {
     int id;
     std::string name;
-    ParamDesc desc;
+    ParamDesc desc{};
+    int32_t value = 0;
+    double position = 0.0;
     std::string text, fullText, minText, maxText;
 };
 
@@ -21,14 +23,14 @@ Row rowOf(ReverbCore& core, int id) {
     Row r;
     r.id = id;
     r.name = parameterName(core, id);
-    core.getParamDesc(id, r.desc);
-    r.text = r.desc.formatValue(false);
-    r.fullText = r.desc.formatValue(true);
-    ParamDesc end = r.desc;
-    end.value = end.minimum;
-    r.minText = end.formatValue(true);
-    end.value = end.maximum;
-    r.maxText = end.formatValue(true);
+    r.desc = *findParam(id);
+    r.value = core.getValue(id);
+    r.position = positionOf(r.desc, r.value);
+    char text[kValueTextCapacity];
+    r.text = formatValue(r.desc, r.value, false, text, sizeof text);
+    r.fullText = formatValue(r.desc, r.value, true, text, sizeof text);
+    r.minText = formatValue(r.desc, r.desc.minimum, true, text, sizeof text);
+    r.maxText = formatValue(r.desc, r.desc.maximum, true, text, sizeof text);
     return r;
 }
 
@@ -68,8 +70,8 @@ std::string paramsTable(ReverbCore& core) {
     for (int id = 0; id < kParamCount; ++id) {
         const Row r = rowOf(core, id);
         out += format("%2d  %-17s  %6d  %-6s  %-9s  %7d  %-8s  %7d  %-8s  %7d  %8.6f\n", r.id, r.name.c_str(),
-                      r.desc.value, r.text.c_str(), r.fullText.c_str(), r.desc.minimum, r.minText.c_str(),
-                      r.desc.maximum, r.maxText.c_str(), r.desc.defaultValue, r.desc.getNormalized());
+                      r.value, r.text.c_str(), r.fullText.c_str(), r.desc.minimum, r.minText.c_str(),
+                      r.desc.maximum, r.maxText.c_str(), r.desc.defaultValue, r.position);
     }
     return out;
 }
@@ -80,9 +82,9 @@ std::string paramsJson(ReverbCore& core) {
         const Row r = rowOf(core, id);
         out += format("  {\"id\": %d, \"name\": %s, \"value\": %d, \"text\": %s, \"fullText\": %s, \"minimum\": %d, "
                       "\"maximum\": %d, \"minText\": %s, \"maxText\": %s, \"default\": %d, \"position\": %.17g}%s\n",
-                      r.id, jsonString(r.name).c_str(), r.desc.value, jsonString(r.text).c_str(),
+                      r.id, jsonString(r.name).c_str(), r.value, jsonString(r.text).c_str(),
                       jsonString(r.fullText).c_str(), r.desc.minimum, r.desc.maximum, jsonString(r.minText).c_str(),
-                      jsonString(r.maxText).c_str(), r.desc.defaultValue, r.desc.getNormalized(),
+                      jsonString(r.maxText).c_str(), r.desc.defaultValue, r.position,
                       id + 1 < kParamCount ? "," : "");
     }
     return out + "]\n";
@@ -94,8 +96,8 @@ std::string presetValues(ReverbCore& core) {
     for (int id = 0; id < kParamCount; ++id) {
         const Row r = rowOf(core, id);
         std::string text = r.fullText;
-        if (id == kAlgorithm) text = kAlgorithmNames[r.desc.value] + std::string(" (") + std::to_string(r.desc.value) + ")";
-        if (id == kMeterSource) text = meterSources[r.desc.value];
+        if (id == kAlgorithm) text = kAlgorithmNames[r.value] + std::string(" (") + std::to_string(r.value) + ")";
+        if (id == kMeterSource) text = meterSources[r.value];
         out += r.name + ": " + text + "\n";
     }
     return out;

@@ -6,6 +6,7 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <cstdio>
+#include <filesystem>
 #include <iostream>
 #include <string>
 
@@ -190,6 +191,10 @@ int run(int argc, char** argv) {
         std::printf("saved %s\n", folder.pathOf(name).c_str());
         return kExitOk;
     }
+    if (!presetNameProblem(name).empty()) throw CliError(presetNameProblem(name));
+    std::error_code missing;
+    if (!std::filesystem::is_regular_file(folder.pathOf(name), missing))
+        failOnPreset(PresetResult::NotFound, name, folder);
     failOnPreset(folder.remove(name), name, folder);
     return kExitOk;
 }

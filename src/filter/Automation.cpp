@@ -18,15 +18,15 @@ bool Intersects(const EnvelopeSegment& s, int64_t s0, int64_t s1) {
 }
 
 // Automation types 2 (switch) and 3 (list) are set by integer value.
-bool SetByValue(ReverbCore& core, int32_t id) {
-    ParamDesc d;
-    return core.getParamDesc(id, d) && (d.automationType == 2 || d.automationType == 3);
+bool SetByValue(int32_t id) {
+    const ParamDesc* d = findParam(id);
+    return d != nullptr && (d->automationType == 2 || d->automationType == 3);
 }
 
 }  // namespace
 
 CoreAutomationSink::CoreAutomationSink(ReverbCore& core) : core_(core) {
-    for (int32_t id = 0; id < kSoundParamCount; ++id) byValue_[id] = SetByValue(core, id);
+    for (int32_t id = 0; id < kSoundParamCount; ++id) byValue_[id] = SetByValue(id);
 }
 
 void CoreAutomationSink::apply(int32_t id, float value) {

@@ -13,14 +13,45 @@ int32_t roundSteps(double d) {
     return static_cast<int32_t>(d > -0.5 ? std::trunc(d + 0.5) : std::trunc(d - 0.5));
 }
 
-int32_t pow10i(int32_t n) {
-    int32_t p = 1;
+int64_t pow10i(int32_t n) {
+    int64_t p = 1;
     while (n-- > 0) p *= 10;
     return p;
 }
 
 // Single-precision constant above which a log-taper position counts as the full range.
 constexpr double kTaperTop = 0.9999989867;
+
+// Appends to a zero-terminated text in a fixed buffer, dropping what does not fit.
+struct TextSink {
+    char* out;
+    size_t capacity;
+    size_t length = 0;
+    void put(char c) {
+        if (length + 1 < capacity) out[length++] = c;
+        out[length] = '\0';
+    }
+    void put(const char* s) {
+        while (*s != '\0') put(*s++);
+    }
+    void putDigits(int64_t v) {
+        char digits[20];
+        int n = 0;
+        do {
+            digits[n++] = static_cast<char>('0' + v % 10);
+            v /= 10;
+        } while (v > 0);
+        while (n > 0) put(digits[--n]);
+    }
+};
+
+// The table is indexed by id and the two position maps are each other's inverse.
+constexpr bool tableIsConsistent() {
+    for (int i = 0; i < kParamCount; ++i)
+        if (kParamTable[i].id != i || kParamAtPosition[kParamPosition[i]] != i) return false;
+    return true;
+}
+static_assert(tableIsConsistent(), "parameter table out of order");
 
 }  // namespace
 
@@ -29,89 +60,76 @@ const char* const kAlgorithmNames[kAlgorithmCount] = {
     "LARGE ROOM *****", "BRIGHT HALL ****", "REVERSED VERB *", "DIFFUSED DELAY *",
 };
 
-ParamDesc::ParamDesc(SkinString name_, SkinString label_, int32_t value_, int32_t decimals_, int32_t width,
-                     int32_t minimum_, int32_t maximum_, bool hasMaxText_, SkinString maxText_, bool hasMinText_,
-                     SkinString minText_, int32_t id_, Curve curve_, int32_t curveBase_, int32_t automationType_)
-    : name(std::move(name_)),
-      label(std::move(label_)),
-      value(value_),
-      decimals(decimals_),
-      displayWidth(width),
-      minimum(minimum_),
-      maximum(maximum_),
-      hasMaxText(hasMaxText_),
-      maxText(std::move(maxText_)),
-      hasMinText(hasMinText_),
-      minText(std::move(minText_)),
-      id(id_),
-      curve(curve_),
-      curveBase(curveBase_),
-      automationType(automationType_),
-      defaultValue(value_),
-      scale(pow10i(decimals_)) {}
-
-double ParamDesc::getNormalized() const {
-    const double range = static_cast<double>(maximum) - minimum;
-    const double lin = (static_cast<double>(value) - minimum) / range;
-    if (curve == Curve::Linear) return lin;
-    const double k = curveBase;
+double positionOf(const ParamDesc& d, int32_t value) {
+    const double range = static_cast<double>(d.maximum) - d.minimum;
+    const double lin = (static_cast<double>(value) - d.minimum) / range;
+    if (d.curve == Curve::Linear) return lin;
+    const double k = d.curveBase;
     return std::log10(1.0 + (k - 1.0) * lin) / std::log10(k);
 }
 
-int32_t ParamDesc::valueAt(float p) const {
+int32_t valueAtPosition(const ParamDesc& d, float p) {
     double pos = p;
     if (!(pos >= 0.0)) pos = 0.0;  // also NaN
     if (pos > 1.0) pos = 1.0;
-    const double range = static_cast<double>(maximum) - minimum;
+    const double range = static_cast<double>(d.maximum) - d.minimum;
     double x = pos;
-    if (curve == Curve::LogTaper) {
-        const double k = curveBase;
+    if (d.curve == Curve::LogTaper) {
+        const double k = d.curveBase;
         x = (std::pow(10.0, std::log10(k) * pos) - 1.0) / (k - 1.0);
         if (x > kTaperTop) x = 1.0;
     }
-    return minimum + roundSteps(range * x);
+    return d.minimum + roundSteps(range * x);
 }
 
-void ParamDesc::setNormalized(float p) { value = valueAt(p); }
+int32_t clampValue(const ParamDesc& d, int32_t v) {
+    return v < d.minimum ? d.minimum : (v > d.maximum ? d.maximum : v);
+}
 
-int32_t ParamDesc::clamp(int32_t v) const { return v < minimum ? minimum : (v > maximum ? maximum : v); }
-
-SkinString ParamDesc::formatValue(bool full) const {
-    if (value == minimum && hasMinText) return minText;
-    if (value == maximum && hasMaxText) return maxText;
-    SkinString out;
+char* formatValue(const ParamDesc& d, int32_t value, bool full, char* out, size_t capacity) {
+    if (out == nullptr || capacity == 0) return out;
+    TextSink text{out, capacity};
+    out[0] = '\0';
+    if (value == d.minimum && d.hasMinText) {
+        text.put(d.minText);
+        return out;
+    }
+    if (value == d.maximum && d.hasMaxText) {
+        text.put(d.maxText);
+        return out;
+    }
     int64_t magnitude = value;
     if (magnitude < 0) {
-        out += '-';
+        text.put('-');
         magnitude = -magnitude;
     }
-    const int64_t unit = pow10i(decimals);
+    const int64_t unit = pow10i(d.decimals);
     const int64_t whole = magnitude / unit;
     if (whole >= 100000000)
-        out += '-';
+        text.put('-');
     else
-        out += std::to_string(whole);
+        text.putDigits(whole);
     int64_t fraction = magnitude - whole * unit;
     if (fraction != 0) {
-        out += '.';
-        for (int32_t d = decimals; d > 0; --d) {
-            const int64_t place = pow10i(d - 1);
-            out += static_cast<char>('0' + fraction / place);
+        text.put('.');
+        for (int32_t digit = d.decimals; digit > 0; --digit) {
+            const int64_t place = pow10i(digit - 1);
+            text.put(static_cast<char>('0' + fraction / place));
             fraction %= place;
         }
     }
-    if (!full && static_cast<int32_t>(out.size()) > displayWidth) {
-        out.resize(displayWidth < 0 ? 0 : displayWidth);
-        if (!out.empty() && out.back() == '.') out.pop_back();
+    if (!full && static_cast<int64_t>(text.length) > d.displayWidth) {
+        text.length = d.displayWidth < 0 ? 0 : static_cast<size_t>(d.displayWidth);
+        if (text.length > 0 && out[text.length - 1] == '.') --text.length;
+        out[text.length] = '\0';
     }
     return out;
 }
 
-int32_t ParamDesc::parseText(const char* text) const {
+int32_t parseValueText(const ParamDesc& d, const char* text) {
     if (text == nullptr) return 0;
     // Leading numeric text counts; anything unreadable reads as 0 (strtod gives 0 with no conversion).
-    const double number = std::strtod(text, nullptr);
-    const double scaled = number * scale;
+    const double scaled = std::strtod(text, nullptr) * d.scale;
     if (std::isnan(scaled)) return 0;
     // Out-of-range numbers saturate; the caller clamps to the parameter's range anyway.
     if (scaled >= 2147483647.0) return INT32_MAX;
@@ -119,48 +137,6 @@ int32_t ParamDesc::parseText(const char* text) const {
     const double nearest = std::round(scaled);
     if (std::fabs(scaled - nearest) <= 1e-6) return static_cast<int32_t>(nearest);
     return static_cast<int32_t>(std::trunc(scaled));
-}
-
-ParamTable::ParamTable() {
-    using C = Curve;
-    // clang-format off
-    //                 name                 label value dec width  min     max  maxText      minText        id  curve        k    auto
-    records[0]  = {"Diffusion",          "",  100, 0, 3,     0,    100, false, "",    false, "",      0, C::Linear,   0,    0};
-    records[1]  = {"Pre Delay",          "",   32, 0, 3,     0,    500, false, "",    false, "",      1, C::LogTaper, 10,   0};
-    records[2]  = {"Decay",              "",   47, 0, 3,     0,    100, false, "",    false, "",      2, C::Linear,   0,    0};
-    records[3]  = {"Damping",            "",   30, 0, 2,     0,     99, false, "",    false, "",      3, C::Linear,   0,    0};
-    records[4]  = {"Room Size",          "",   46, 0, 3,     0,    200, false, "",    false, "",      4, C::LogTaper, 10,   0};
-    records[5]  = {"Early Reflections",  "",    0, 1, 4,  -600,      0, false, "",    true,  "-Inf.", 5, C::Linear,   0,    0};
-    records[6]  = {"Output Level Wet",   "", -180, 1, 4,  -600,     60, false, "",    true,  "-Inf.", 6, C::Linear,   0,    0};
-    records[7]  = {"Output Level Dry",   "",    0, 1, 4,  -600,     60, false, "",    true,  "-Inf.", 7, C::Linear,   0,    0};
-    records[8]  = {"Colour",             "",   56, 0, 3,     1,    100, false, "",    false, "",      8, C::LogTaper, 10,   0};
-    records[9]  = {"Input Gain",         "",    0, 1, 4,  -300,    150, false, "",    false, "",      9, C::Linear,   0,    0};
-    records[10] = {"Low Pass Freq",      "", 10000, 0, 5,   20,  10000, true,  "Off", false, "",     10, C::LogTaper, 1000, 0};
-    records[11] = {"High Pass Freq",     "",  125, 0, 5,   100,  16000, false, "",    true,  "Off",  11, C::LogTaper, 1000, 0};
-    records[12] = {"Notch Q",            "",   30, 1, 3,     1,     50, false, "",    false, "",     14, C::Linear,   0,    0};
-    records[13] = {"Notch Gain",         "",    0, 1, 3,  -120,    120, false, "",    false, "",     13, C::Linear,   0,    0};
-    records[14] = {"Notch Freq",         "", 2000, 0, 5,    20,  16000, false, "",    false, "",     12, C::LogTaper, 1000, 0};
-    records[15] = {"",                   "",    2, 1, 1,     0,      7, false, "",    false, "",     15, C::Linear,   0,    0};
-    records[16] = {"",                   "",    1, 0, 3,     0,      2, false, "",    false, "",     16, C::Linear,   0,    0};
-    // clang-format on
-}
-
-ParamDesc* ParamTable::find(int32_t id) {
-    for (ParamDesc& r : records)
-        if (r.id == id) return &r;
-    return nullptr;
-}
-
-const ParamDesc* ParamTable::find(int32_t id) const {
-    for (const ParamDesc& r : records)
-        if (r.id == id) return &r;
-    return nullptr;
-}
-
-int ParamTable::position(int32_t id) const {
-    for (int i = 0; i < kParamCount; ++i)
-        if (records[i].id == id) return i;
-    return -1;
 }
 
 ProgramMemory::ProgramMemory() {

@@ -15,46 +15,66 @@ constexpr int32_t kRowLoadOrder[kSoundParamCount] = {10, 11, 14, 13, 12, 0, 1, 2
 // Order in which a settings record is applied after its algorithm.
 constexpr int32_t kStateLoadOrder[16] = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 14, 13, 12, 16};
 
-double levelGain(const ParamDesc& p) { return p.value == p.minimum ? 0.0 : std::pow(10.0, p.value * 0.005); }
+double levelGain(int32_t id, int32_t value) {
+    return value == findParam(id)->minimum ? 0.0 : std::pow(10.0, value * 0.005);
+}
 
 }  // namespace
 
+ReverbCore::Guard::Guard(ReverbCore& core) : core_(core) {
+    core_.lock_.lock();
+    ++core_.lockDepth_;
+}
+
+ReverbCore::Guard::~Guard() {
+    if (--core_.lockDepth_ == 0 && !core_.pendingReports_.empty()) {
+        core_.deliverCaptureReports();
+        return;
+    }
+    core_.lock_.unlock();
+}
+
+// Called by the outermost guard with the lock held once; releases it before calling out, so that a
+// capture target may call back into the core from any thread.
+void ReverbCore::deliverCaptureReports() {
+    std::vector<CaptureReport> reports(std::move(pendingReports_));
+    pendingReports_.clear();
+    lock_.unlock();
+    for (const CaptureReport& r : reports) r.target->captureParameter(r.id, r.position);
+}
+
 ReverbCore::ReverbCore() {
-    // The records are registered at positions 0..14, then Meter Source, then Algorithm.
-    for (int i = 0; i < kSoundParamCount; ++i) params_.push_back(&table_.records[i]);
-    params_.push_back(&table_.records[16]);
-    params_.push_back(&table_.records[15]);
-    for (int i = 0; i < kSoundParamCount; ++i) mediaParamIds_[i] = i;
+    for (int32_t id = 0; id < kParamCount; ++id) values_[id] = kParamTable[id].defaultValue;
     host_ = this;
     engine_.SetOwner(this);
 }
 
 ReverbCore::~ReverbCore() {
-    MutexLock g(lock_);
+    Guard g(*this);
     listeners_.clear();
-    params_.clear();
 }
 
-bool ReverbCore::applyParam(ParamDesc& p) {
+bool ReverbCore::applyParam(int32_t id) {
     engine_.SetSampleRate(static_cast<int>(std::round(sampleRate_)));
-    switch (p.id) {
-        case kDiffusion: engine_.SetDiffusion(p.value); break;
-        case kPreDelay: engine_.SetPreDelay(p.value); break;
-        case kDecay: engine_.SetDecay(p.value); break;
-        case kDamping: engine_.SetDamping(p.value); break;
-        case kRoomSize: engine_.SetRoomSize(p.value); break;
-        case kEarlyReflections: engine_.SetEarlyLevel(levelGain(p)); break;
-        case kOutputLevelWet: engine_.SetWetLevel(levelGain(p)); break;
-        case kOutputLevelDry: engine_.SetDryLevel(levelGain(p)); break;
-        case kColour: engine_.SetColour(p.value); break;
-        case kInputGain: engine_.SetInputGain(p.value); break;
-        case kLowPassFreq: engine_.SetLowPassFreq(p.value); break;
-        case kHighPassFreq: engine_.SetHighPassFreq(p.value); break;
-        case kNotchFreq: engine_.SetNotchFreq(p.value); break;
-        case kNotchGain: engine_.SetNotchGain(p.value * 0.1); break;
-        case kNotchQ: engine_.SetNotchQ(p.value * 0.1); break;
-        case kAlgorithm: engine_.SetMode(p.value); break;
-        case kMeterSource: engine_.SetMeterSource(p.value); break;
+    const int32_t v = values_[id];
+    switch (id) {
+        case kDiffusion: engine_.SetDiffusion(v); break;
+        case kPreDelay: engine_.SetPreDelay(v); break;
+        case kDecay: engine_.SetDecay(v); break;
+        case kDamping: engine_.SetDamping(v); break;
+        case kRoomSize: engine_.SetRoomSize(v); break;
+        case kEarlyReflections: engine_.SetEarlyLevel(levelGain(id, v)); break;
+        case kOutputLevelWet: engine_.SetWetLevel(levelGain(id, v)); break;
+        case kOutputLevelDry: engine_.SetDryLevel(levelGain(id, v)); break;
+        case kColour: engine_.SetColour(v); break;
+        case kInputGain: engine_.SetInputGain(v); break;
+        case kLowPassFreq: engine_.SetLowPassFreq(v); break;
+        case kHighPassFreq: engine_.SetHighPassFreq(v); break;
+        case kNotchFreq: engine_.SetNotchFreq(v); break;
+        case kNotchGain: engine_.SetNotchGain(v * 0.1); break;
+        case kNotchQ: engine_.SetNotchQ(v * 0.1); break;
+        case kAlgorithm: engine_.SetMode(v); break;
+        case kMeterSource: engine_.SetMeterSource(v); break;
         default: return false;
     }
     applied_ = true;
@@ -62,81 +82,77 @@ bool ReverbCore::applyParam(ParamDesc& p) {
 }
 
 bool ReverbCore::setNormalized(int32_t id, float position) {
-    MutexLock g(lock_);
-    ParamDesc* p = table_.find(id);
-    if (p == nullptr) return false;
-    p->setNormalized(position);
-    return applyParam(*p);
+    Guard g(*this);
+    const ParamDesc* d = findParam(id);
+    if (d == nullptr) return false;
+    values_[id] = valueAtPosition(*d, position);
+    return applyParam(id);
 }
 
 float ReverbCore::getNormalized(int32_t id) {
-    MutexLock g(lock_);
-    const ParamDesc* p = table_.find(id);
-    return p ? static_cast<float>(p->getNormalized()) : 0.0f;
+    Guard g(*this);
+    const ParamDesc* d = findParam(id);
+    return d ? static_cast<float>(positionOf(*d, values_[id])) : 0.0f;
 }
 
 void ReverbCore::switchAlgorithm(int32_t newValue) {
-    ParamDesc* algorithm = table_.find(kAlgorithm);
-    const int32_t leaving = algorithm->value;
-    for (int pos = 0; pos < kSoundParamCount; ++pos) memory_.rows[leaving][pos] = table_.records[pos].value;
-    algorithm->value = algorithm->clamp(newValue);
-    applyParam(*algorithm);
+    const int32_t leaving = values_[kAlgorithm];
+    for (int pos = 0; pos < kSoundParamCount; ++pos) memory_.rows[leaving][pos] = values_[kParamAtPosition[pos]];
+    values_[kAlgorithm] = clampValue(kParamTable[kAlgorithm], newValue);
+    applyParam(kAlgorithm);
     if (busy_) busy_->begin();
-    const int32_t row = algorithm->value;
-    for (int32_t id : kRowLoadOrder) setValue(id, memory_.rows[row][table_.position(id)]);
+    const int32_t row = values_[kAlgorithm];
+    for (int32_t id : kRowLoadOrder) setValue(id, memory_.rows[row][kParamPosition[id]]);
     if (busy_) busy_->end();
 }
 
 bool ReverbCore::setValue(int32_t id, int32_t value) {
-    MutexLock g(lock_);
-    ParamDesc* p = table_.find(id);
-    if (p == nullptr) return false;
+    Guard g(*this);
+    const ParamDesc* d = findParam(id);
+    if (d == nullptr) return false;
     if (id == kAlgorithm) {
         switchAlgorithm(value);
         return true;
     }
-    p->value = p->clamp(value);
-    return applyParam(*p);
+    values_[id] = clampValue(*d, value);
+    return applyParam(id);
 }
 
 int32_t ReverbCore::getValue(int32_t id) {
-    MutexLock g(lock_);
-    const ParamDesc* p = table_.find(id);
-    return p ? p->value : 0;
+    Guard g(*this);
+    return findParam(id) ? values_[id] : 0;
 }
 
 void ReverbCore::notifyListeners(int32_t id) {
-    MutexLock g(lock_);
+    Guard g(*this);
     for (CoreListener* l : listeners_) l->refresh(id + kRefreshParamBase);
 }
 
 char* ReverbCore::getValueText(int32_t id, char* buffer, bool full) {
     if (buffer == nullptr) return buffer;
     buffer[0] = '\0';
-    ParamDesc copy;
-    if (!getParamDesc(id, copy)) return buffer;
-    const SkinString text = copy.formatValue(full);
-    const size_t n = std::min(text.size(), static_cast<size_t>(kTextCapacity - 1));
-    std::memcpy(buffer, text.data(), n);
-    buffer[n] = '\0';
+    Guard g(*this);
+    const ParamDesc* d = findParam(id);
+    if (d != nullptr) formatValue(*d, values_[id], full, buffer, kTextCapacity);
     return buffer;
 }
 
-bool ReverbCore::setValueText(int32_t id, SkinString text) {
-    MutexLock g(lock_);
-    const ParamDesc* p = table_.find(id);
-    if (p == nullptr) return false;
-    return setValueAndNotify(id, p->parseText(text.c_str()));
+bool ReverbCore::setValueText(int32_t id, const char* text) {
+    Guard g(*this);
+    const ParamDesc* d = findParam(id);
+    if (d == nullptr) return false;
+    return setValueAndNotify(id, parseValueText(*d, text));
 }
 
 void ReverbCore::notifyHost(int32_t id, float position) {
-    MutexLock g(lock_);
+    Guard g(*this);
     if (host_ != nullptr) host_->parameterChanged(id, position);
 }
 
 void ReverbCore::parameterChanged(int32_t id, float position) {
+    Guard g(*this);
     setNormalized(id, position);
-    if (captureTarget_ != nullptr) captureTarget_->captureParameter(id, position);
+    if (captureTarget_ != nullptr) pendingReports_.push_back({captureTarget_, id, position});
 }
 
 bool ReverbCore::preparedResponse(std::vector<float>& left, std::vector<float>& right) {
@@ -145,9 +161,9 @@ bool ReverbCore::preparedResponse(std::vector<float>& left, std::vector<float>& 
 }
 
 float ReverbCore::getStatus(int32_t code) {
-    MutexLock g(lock_);
+    Guard g(*this);
     if (code == kStatusLoad) {
-        switch (table_.find(kAlgorithm)->value) {
+        switch (values_[kAlgorithm]) {
             case 0:
             case 7: return 0.062f;
             case 1: return 0.123f;
@@ -177,40 +193,37 @@ void ReverbCore::setHost(CoreHost* h) { host_ = h; }
 CoreHost* ReverbCore::getHost() { return host_; }
 
 void ReverbCore::addListener(CoreListener* l) {
-    MutexLock g(lock_);
+    Guard g(*this);
     listeners_.push_back(l);
 }
 
 void ReverbCore::removeListener(CoreListener* l) {
-    MutexLock g(lock_);
+    Guard g(*this);
     listeners_.erase(std::remove(listeners_.begin(), listeners_.end(), l), listeners_.end());
 }
 
 bool ReverbCore::setValueAndNotify(int32_t id, int32_t value) {
-    MutexLock g(lock_);
+    Guard g(*this);
     if (!setValue(id, value)) return false;
     notifyHost(id, getNormalized(id));
     return true;
 }
 
-void ReverbCore::setFormat(float sampleRate, int32_t reserved, int32_t inChannels, int32_t outChannels) {
-    MutexLock g(lock_);
+void ReverbCore::setFormat(float sampleRate, int32_t, int32_t, int32_t) {
+    Guard g(*this);
     sampleRate_ = sampleRate;
-    reservedFormat_ = reserved;
-    inChannels_ = inChannels;
-    outChannels_ = outChannels;
 }
 
 int32_t ReverbCore::processStereo(const float* inLeft, const float* inRight, float* outLeft, float* outRight,
                                   int32_t frames, int32_t stride, int32_t /*restart*/, int32_t flush,
                                   int32_t accumulate) {
-    MutexLock g(lock_);
+    Guard g(*this);
     return engine_.ProcessBlock(outLeft, outRight, inLeft, inRight, frames, stride, accumulate == 1, flush);
 }
 
 int32_t ReverbCore::trackLevel(const float* samples, const void*, int32_t count, int32_t stride, int32_t,
                                int32_t) {
-    MutexLock g(lock_);
+    Guard g(*this);
     static const float attack = static_cast<float>(1.0 - std::exp(-0.030642888258557023));
     static const float release = static_cast<float>(std::exp(-6.128577478167001e-05));
     for (int32_t i = 0; i < count; ++i) {
@@ -225,43 +238,39 @@ int32_t ReverbCore::trackLevel(const float* samples, const void*, int32_t count,
 
 int32_t ReverbCore::copyMono(const float* source, float* destination, int32_t count, int32_t, int32_t,
                              int32_t add) {
-    MutexLock g(lock_);
+    Guard g(*this);
     for (int32_t i = 0; i < count; ++i) destination[i] = add ? destination[i] + source[i] : source[i];
     return count;
 }
 
-int32_t ReverbCore::reservedProcess(int32_t, int32_t b, int32_t, int32_t) {
-    MutexLock g(lock_);
-    return b;
-}
+int32_t ReverbCore::passSecond(int32_t, int32_t b, int32_t, int32_t) { return b; }
 
 bool ReverbCore::applyAll() {
-    MutexLock g(lock_);
-    for (int32_t id = 0; id < kParamCount; ++id) applyParam(*table_.find(id));
+    Guard g(*this);
+    for (int32_t id = 0; id < kParamCount; ++id) applyParam(id);
     return true;
 }
 
 void ReverbCore::resetLevel() {
-    MutexLock g(lock_);
+    Guard g(*this);
     level = 0.0f;
 }
 
 bool ReverbCore::startStreaming() {
-    MutexLock g(lock_);
+    Guard g(*this);
     if (!applied_) applyAll();
-    std::memset(meterBlock_, 0, sizeof meterBlock_);
     stopped_ = false;
     engine_.ResetState();
     return true;
 }
 
 void ReverbCore::resumeAfterFlush() {
-    MutexLock g(lock_);
+    Guard g(*this);
     engine_.ClearEndOfStream();
 }
 
 void ReverbCore::stopStreaming() {
-    MutexLock g(lock_);
+    Guard g(*this);
     stopped_ = true;
 }
 
@@ -269,11 +278,11 @@ int32_t ReverbCore::stateSize() { return kCoreStateSize; }
 
 bool ReverbCore::saveState(uint8_t* buffer) {
     if (buffer == nullptr) return false;
-    MutexLock g(lock_);
+    Guard g(*this);
     putLe32(buffer, kCoreStateSize);
     std::memcpy(buffer + kCoreStateGuidOffset, kCoreStateGuid, sizeof kCoreStateGuid);
     for (int pos = 0; pos < kParamCount; ++pos)
-        putLe32(buffer + kCoreStateValuesOffset + 4 * pos, static_cast<uint32_t>(table_.records[pos].value));
+        putLe32(buffer + kCoreStateValuesOffset + 4 * pos, static_cast<uint32_t>(values_[kParamAtPosition[pos]]));
     return true;
 }
 
@@ -284,10 +293,10 @@ bool ReverbCore::validateState(const uint8_t* buffer, int32_t size) {
 }
 
 bool ReverbCore::loadState(const uint8_t* buffer, int32_t size) {
-    MutexLock g(lock_);
+    Guard g(*this);
     if (!validateState(buffer, size)) return false;
     auto valueOf = [&](int32_t id) {
-        return static_cast<int32_t>(getLe32(buffer + kCoreStateValuesOffset + 4 * table_.position(id)));
+        return static_cast<int32_t>(getLe32(buffer + kCoreStateValuesOffset + 4 * kParamPosition[id]));
     };
     setValue(kAlgorithm, valueOf(kAlgorithm));
     for (int32_t id : kStateLoadOrder) setValue(id, valueOf(id));
@@ -296,25 +305,17 @@ bool ReverbCore::loadState(const uint8_t* buffer, int32_t size) {
 }
 
 void ReverbCore::setCaptureTarget(CaptureTarget* t) {
-    MutexLock g(lock_);
+    Guard g(*this);
     captureTarget_ = t;
 }
 
 void ReverbCore::setBusyIndicator(BusyIndicator* b) {
-    MutexLock g(lock_);
+    Guard g(*this);
     busy_ = b;
 }
 
-bool ReverbCore::getParamDesc(int32_t id, ParamDesc& out) {
-    MutexLock g(lock_);
-    const ParamDesc* p = table_.find(id);
-    if (p == nullptr) return false;
-    out = *p;
-    return true;
-}
-
 int32_t ReverbCore::memoryValue(int32_t algorithm, int column) {
-    MutexLock g(lock_);
+    Guard g(*this);
     if (algorithm < 0 || algorithm >= kAlgorithmCount || column < 0 || column >= kSoundParamCount) return 0;
     return memory_.rows[algorithm][column];
 }

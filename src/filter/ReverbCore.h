@@ -1,13 +1,16 @@
-// ReverbCore: the host-independent effect. It owns the parameter table, the per-algorithm memory and the
-// engine, applies parameters under its re-entrant lock, switches algorithms with their remembered
-// settings, processes audio blocks and saves and loads the 88-byte settings record. The DirectShow
-// filter, the editor and the command-line tool all drive it through these operations.
+// ReverbCore: the host-independent effect. It holds the live parameter values beside the constant
+// parameter table, the per-algorithm memory and the engine; applies parameters under its re-entrant lock,
+// switches algorithms with their remembered settings, processes audio blocks and saves and loads the
+// 88-byte settings record. The DirectShow filter, the editor and the command-line tool all drive it
+// through these operations.
 //
-// Threads: every operation that touches parameters, state or the engine takes the core's lock for its
-// whole duration; the lock is re-entrant because operations call one another under it. Listener and
-// host callbacks run with the lock held, so a listener must not wait for a thread that needs it.
-// Allocation: applying "Algorithm", "Room Size" and (in some algorithms) other parameters rebuilds the
-// engine's network and allocates; processStereo allocates only to grow its scratch to a larger block.
+// Threads: each operation's tag says who may call it, which lock it takes and whether it may allocate.
+// The lock is re-entrant because operations call one another under it. Listener refreshes and a
+// CoreHost other than the core itself run with the lock held, so they must not wait for a thread that
+// needs it. Capture reports are made after the outermost lock is released, in the order of the changes.
+// "May allocate": applying a parameter that rebuilds the engine's networks (Algorithm, Room Size, Pre
+// Delay and, in some algorithms, Diffusion, Decay and Damping) allocates; processStereo allocates only
+// to grow its scratch to a larger block than any before.
 #pragma once
 
 #include <cstdint>
@@ -66,66 +69,101 @@ public:
     ReverbCore& operator=(const ReverbCore&) = delete;
 
     // Parameters. An unknown id is rejected (false / 0) without touching anything.
+    // [any thread] locks core; may allocate. Maps the position (no memory rows, even for Algorithm).
     virtual bool setNormalized(int32_t id, float position);
+    // [any thread] locks core; never allocates.
     virtual float getNormalized(int32_t id);
-    // Clamps, stores and applies; id 15 switches algorithm: the current sound values are saved into the
-    // old algorithm's memory row and the new algorithm's row is loaded.
+    // [any thread] locks core; may allocate. Clamps, stores and applies; id 15 switches algorithm: the
+    // current sound values are saved into the old algorithm's memory row and the new row is loaded.
     virtual bool setValue(int32_t id, int32_t value);
+    // [any thread] locks core; never allocates.
     virtual int32_t getValue(int32_t id);
+    // [any thread] locks core; never allocates (listeners run under the lock).
     virtual void notifyListeners(int32_t id);
-    // Writes the value's text into buffer (at least kTextCapacity bytes) and returns buffer.
+    // [any thread] locks core; never allocates. Writes the value's text into buffer (at least
+    // kTextCapacity bytes) and returns buffer; an empty text for an unknown id.
     virtual char* getValueText(int32_t id, char* buffer, bool full);
-    virtual bool setValueText(int32_t id, SkinString text);
+    // [any thread] locks core; may allocate. Parses text in the parameter's shown units, then
+    // setValueAndNotify.
+    virtual bool setValueText(int32_t id, const char* text);
+    // [any thread] locks core; may allocate. Hands the change to the host (by default the core itself,
+    // which applies the position and queues a capture report).
     virtual void notifyHost(int32_t id, float position);
-    // 2: the algorithm's processing-load figure; 200: 1 when stopped; otherwise the meter level 0..1.
+    // [any thread] locks core; never allocates. 2: the algorithm's processing-load figure; 200: 1 when
+    // stopped; otherwise the meter level 0..1.
     virtual float getStatus(int32_t code);
-    virtual void reserved9(int32_t) {}
-    virtual void reserved10(int32_t, int32_t) {}
-    virtual int32_t reserved11() { return 0; }
-    virtual void reserved12(int32_t) {}
+    // Placeholders that keep the later operations in their slots: they do nothing, or return a constant
+    // or an argument. [any thread] no lock; never allocate.
+    virtual void ignoreOne(int32_t) {}
+    virtual void ignoreTwo(int32_t, int32_t) {}
+    virtual int32_t zero() { return 0; }
+    virtual void ignoreOneMore(int32_t) {}
+    // [any thread] no lock; never allocates. Does nothing.
     virtual void idle() override {}
+    // [set-up and tear-down only] no lock; never allocate.
     virtual void setHost(CoreHost* h);
     virtual CoreHost* getHost();
+    // [any thread] locks core; may allocate.
     virtual void addListener(CoreListener* l);
+    // [any thread] locks core; never allocates. Removes every entry equal to l.
     virtual void removeListener(CoreListener* l);
+    // [any thread] locks core; may allocate. setValue, then notifyHost with the value's position.
     virtual bool setValueAndNotify(int32_t id, int32_t value);
-    // Stores the stream format; takes effect at the next apply.
+    // [any thread] locks core; never allocates. Stores the sample rate for the next apply; the other
+    // arguments are accepted for the callers' sake and not used.
     virtual void setFormat(float sampleRate, int32_t reserved, int32_t inChannels, int32_t outChannels);
 
-    // Processing (streaming thread). processStereo returns the number of output frames that carry
-    // signal: frames for an ordinary block, fewer while the end-of-stream tail is being trimmed.
+    // Processing. processStereo returns the number of output frames that carry signal: frames for an
+    // ordinary block, fewer while the end-of-stream tail is being trimmed.
+    // [streaming thread] locks core; allocates only to grow the mono scratch to a larger block.
     virtual int32_t processStereo(const float* inLeft, const float* inRight, float* outLeft, float* outRight,
                                   int32_t frames, int32_t stride, int32_t restart, int32_t flush,
                                   int32_t accumulate);
+    // [streaming thread] locks core; never allocates.
     virtual int32_t trackLevel(const float* samples, const void* unused, int32_t count, int32_t stride,
                                int32_t unused2, int32_t unused3);
+    // [streaming thread] locks core; never allocates.
     virtual int32_t copyMono(const float* source, float* destination, int32_t count, int32_t restart,
                              int32_t flush, int32_t add);
-    virtual int32_t reservedProcess(int32_t a, int32_t b, int32_t c, int32_t d);
+    // Placeholder in the processing slots: returns its second argument. [any thread] no lock; never
+    // allocates.
+    virtual int32_t passSecond(int32_t a, int32_t b, int32_t c, int32_t d);
 
+    // [graph thread] locks core; may allocate. Applies every parameter in id order.
     virtual bool applyAll();
+    // [any thread] locks core; never allocates.
     virtual void resetLevel();
+    // [graph thread] locks core; may allocate (the first apply and the engine's reset).
     virtual bool startStreaming();
+    // [graph thread] locks core; never allocates.
     virtual void stopStreaming();
-    // After a flush (a seek): the stream goes on, so an earlier end of stream no longer trims its blocks.
-    // The reverb's sound state carries over.
+    // [graph thread] locks core; never allocates. After a flush (a seek): the stream goes on, so an
+    // earlier end of stream no longer trims its blocks. The reverb's sound state carries over.
     void resumeAfterFlush();
 
     // The settings record.
+    // [any thread] no lock; never allocates.
     virtual int32_t stateSize();
+    // [any thread] locks core; never allocates.
     virtual bool saveState(uint8_t* buffer);
+    // [any thread] locks core; may allocate (the algorithm switch).
     virtual bool loadState(const uint8_t* buffer, int32_t size);
+    // [any thread] no lock (reads only its arguments); never allocates.
     virtual bool validateState(const uint8_t* buffer, int32_t size);
-    virtual double reserved32(const ParamDesc&) { return 0.0; }
+    // Placeholder: returns 0.0. [any thread] no lock; never allocates.
+    virtual double zeroForParam(const ParamDesc&) { return 0.0; }
 
     // Host integration that is not part of the core's slot list.
+    // [any thread] locks core; never allocates. The target receives each change that goes through
+    // notifyHost, on the changing thread, after the core's lock is released.
     void setCaptureTarget(CaptureTarget* t);
+    // [any thread] locks core; never allocates.
     void setBusyIndicator(BusyIndicator* b);
-    // A copy of a parameter's record, taken under the lock; false for an unknown id.
-    bool getParamDesc(int32_t id, ParamDesc& out);
+    // [any thread] locks core; never allocates. A value of an algorithm's memory row (column = table
+    // position); 0 outside the rows.
     int32_t memoryValue(int32_t algorithm, int column);
 
-    static constexpr int kTextCapacity = 32;
+    static constexpr int kTextCapacity = static_cast<int>(kValueTextCapacity);
 
     // Copies the convolution response prepared for the applied settings (one sample per frame at the stream
     // rate, per channel); false when the algorithm is not a convolution or nothing is prepared yet.
@@ -137,25 +175,40 @@ public:
     const ReverbEngine& engineForInspection() const { return engine_; }
 
 private:
-    void parameterChanged(int32_t id, float position) override;
-    bool applyParam(ParamDesc& p);
-    void switchAlgorithm(int32_t newValue);
+    // One capture report waiting for the outermost lock to be released.
+    struct CaptureReport {
+        CaptureTarget* target;
+        int32_t id;
+        float position;
+    };
+    // Holds the core's lock; the outermost guard delivers the queued capture reports after unlocking.
+    class Guard {
+    public:
+        explicit Guard(ReverbCore& core);
+        ~Guard();
+        Guard(const Guard&) = delete;
+        Guard& operator=(const Guard&) = delete;
 
-    uint8_t meterBlock_[32] = {};
+    private:
+        ReverbCore& core_;
+    };
+
+    void parameterChanged(int32_t id, float position) override;
+    bool applyParam(int32_t id);
+    void switchAlgorithm(int32_t newValue);
+    void deliverCaptureReports();
+
     Mutex lock_;
-    std::vector<ParamDesc*> params_;
+    int lockDepth_ = 0;  // guards held by the locking thread
+    std::vector<CaptureReport> pendingReports_;
     std::vector<CoreListener*> listeners_;
     CoreHost* host_ = nullptr;
     float sampleRate_ = 44100.0f;
-    int32_t reservedFormat_ = 0;
-    int32_t inChannels_ = 2;
-    int32_t outChannels_ = 2;
-    ParamTable table_;
+    int32_t values_[kParamCount];  // live values in steps, indexed by id
     bool applied_ = false;
     ReverbEngine engine_;
     ProgramMemory memory_;
     bool stopped_ = false;
-    int32_t mediaParamIds_[kSoundParamCount];
     CaptureTarget* captureTarget_ = nullptr;
     BusyIndicator* busy_ = nullptr;
 };

@@ -196,8 +196,10 @@ PresetResult PresetFolder::remove(const std::string& name) const {
     const fs::path target = pathOf(name);
     std::error_code ec;
     const fs::file_status st = fs::symlink_status(target, ec);
-    if (st.type() != fs::file_type::regular && st.type() != fs::file_type::symlink) return PresetResult::NotFound;
-    return fs::remove(target, ec) && !ec ? PresetResult::Ok : PresetResult::IoError;
+    if (st.type() == fs::file_type::not_found) return PresetResult::Ok;  // nothing to delete
+    if (st.type() != fs::file_type::regular && st.type() != fs::file_type::symlink) return PresetResult::IoError;
+    fs::remove(target, ec);
+    return ec ? PresetResult::IoError : PresetResult::Ok;
 }
 
 PresetResult readStateFile(const std::string& path, StateBytes& out) { return readRecord(path, out); }

@@ -72,7 +72,8 @@ public:
     // the record goes to a temporary file beside the target, which is renamed over it when complete, so
     // a failure leaves either the old file or none, never a partial one.
     PresetResult save(const std::string& name, ReverbCore& core, OverwriteQuestion& ask) const;
-    // Deletes the preset file of name; NotFound when there is no such regular file.
+    // Deletes the preset file of name. A missing file is nothing to delete (Ok); something else under
+    // that name, such as a directory, is left alone (IoError).
     PresetResult remove(const std::string& name) const;
 
 private:

@@ -46,8 +46,9 @@ HRESULT StereoCopyOf(const AM_MEDIA_TYPE* src, AM_MEDIA_TYPE* dst) {
 }
 
 // Parameter records for the media-parameter descriptions; false for an index that is not published.
-bool Describe(ReverbCore* core, DWORD index, ParamDesc& d) {
-    return index < kMediaParamCount && core->getParamDesc(static_cast<int32_t>(index), d);
+// The description of a media parameter: a pointer into the constant table, null for an index beyond it.
+const ParamDesc* Describe(DWORD index) {
+    return index < kMediaParamCount ? findParam(static_cast<int32_t>(index)) : nullptr;
 }
 
 bool ShowsUnit(const ParamDesc& d) { return d.automationType == 2 || d.automationType == 3; }
@@ -496,8 +497,9 @@ STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
     return ComBoundary([&]() -> HRESULT {
         CritSecLock g(paramLock_);
         ReverbCore* core = control_->GetCore();
-        ParamDesc d;
-        if (!Describe(core, index, d)) return E_INVALIDARG;
+        const ParamDesc* found = Describe(index);
+        if (found == nullptr) return E_INVALIDARG;
+        const ParamDesc& d = *found;
         std::memset(info, 0, sizeof *info);
         if (d.automationType == 2) {
             info->mpType = MPT_BOOL;
@@ -518,8 +520,8 @@ STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
             info->mpdMaxValue = 1.0f;
             info->mpdNeutralValue = core->getNormalized(d.id);
         }
-        AnsiToWide(d.name.c_str(), info->szLabel, 32);
-        AnsiToWide(ShowsUnit(d) ? d.label.c_str() : "", info->szUnitText, 32);
+        AnsiToWide(d.name, info->szLabel, 32);
+        AnsiToWide(ShowsUnit(d) ? d.label : "", info->szUnitText, 32);
         return S_OK;
     });
 }
@@ -529,8 +531,9 @@ STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
     if (text == nullptr) return E_POINTER;
     return ComBoundary([&]() -> HRESULT {
         CritSecLock g(paramLock_);
-        ParamDesc d;
-        if (!Describe(control_->GetCore(), index, d)) return E_INVALIDARG;
+        const ParamDesc* found = Describe(index);
+        if (found == nullptr) return E_INVALIDARG;
+        const ParamDesc& d = *found;
         constexpr int kChars = 256;  // a 512-byte block
         auto* block = static_cast<WCHAR*>(CoTaskMemAlloc(kChars * sizeof(WCHAR)));
         if (block == nullptr) return E_OUTOFMEMORY;
@@ -541,10 +544,8 @@ STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
             AnsiToWide(s, block + at, kChars - 1 - at);
             at += static_cast<int>(wcslen(block + at)) + 1;
         };
-        append(d.name.c_str());
-        append(ShowsUnit(d) ? d.label.c_str() : "");
-        if (d.automationType == 3)
-            for (const SkinString& n : d.valueNames) append(n.c_str());
+        append(d.name);
+        append(ShowsUnit(d) ? d.label : "");
         *text = block;
         return S_OK;
     });
