@@ -32,6 +32,14 @@ enum class EndOfStream { PreDelayAlways, PreDelayWhenOn, PreDelayNever, Response
 // itself), the mono sum through the filter sections, or both channels through them.
 enum class InputStage { None, Mono, Stereo };
 
+// How a kernel's block differs from the others', read by the block driver at compile time.
+struct BlockPolicy {
+    bool meterBeforeLatch;    // meter decay and input meter before the end-of-stream latch
+    EndOfStream end;          // what holds the tail open once the stream has ended
+    InputStage input;         // the input stage the driver runs before the kernel's frames
+    bool flushNetworkStates;  // colour and damping states cleaned after the block
+};
+
 class ReverbEngine {
 public:
     static constexpr int kNetworkLines = 24;
@@ -171,14 +179,9 @@ private:
     // stays stable at any rate while the parameter keeps the value the user set.
     int designLimit(int hz) const;
 
-    // A kernel's policy is a type with these members:
-    //   static constexpr bool kMeterBeforeLatch;    meter decay and input meter before the end-of-stream latch
-    //   static constexpr EndOfStream kEnd;
-    //   static constexpr InputStage kInput;
-    //   static constexpr bool kFlushNetworkStates;  colour and damping states cleaned after the block
     using KernelFrames = void (ReverbEngine::*)(float* outLeft, float* outRight, const float* inLeft,
                                                 const float* inRight, int frames, int stride, int accumulate);
-    template <class Policy, KernelFrames kFrames>
+    template <const BlockPolicy& kPolicy, KernelFrames kFrames>
     int RunBlock(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames, int stride,
                  int accumulate, int flush);
 

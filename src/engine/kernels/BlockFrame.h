@@ -72,26 +72,26 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::makeStereo(const float* inLeft, const f
 // One block: the end-of-stream latch, the meter decay and the input meter (in the order the policy states),
 // the input stage, the kernel's frames (kFrames writes every output frame), the block's meter and the
 // network's denormal clean-up, then the number of frames that carry signal.
-template <class Policy, ReverbEngine::KernelFrames kFrames>
+template <const BlockPolicy& kPolicy, ReverbEngine::KernelFrames kFrames>
 ULVETTA_ALWAYS_INLINE int ReverbEngine::RunBlock(float* outLeft, float* outRight, const float* inLeft,
                                                  const float* inRight, int frames, int stride, int accumulate,
                                                  int flush) {
-    if (Policy::kMeterBeforeLatch && frames > 0) meterBlockInput(inLeft, inRight, frames, stride);
-    latchEndOfStream(flush, Policy::kEnd);
+    if (kPolicy.meterBeforeLatch && frames > 0) meterBlockInput(inLeft, inRight, frames, stride);
+    latchEndOfStream(flush, kPolicy.end);
     if (frames <= 0) return 0;
-    if (!Policy::kMeterBeforeLatch) meterBlockInput(inLeft, inRight, frames, stride);
-    if (Policy::kInput == InputStage::Mono) {
+    if (!kPolicy.meterBeforeLatch) meterBlockInput(inLeft, inRight, frames, stride);
+    if (kPolicy.input == InputStage::Mono) {
         makeMono(inLeft, inRight, frames, stride);
         filterMono(frames);
-    } else if (Policy::kInput == InputStage::Stereo) {
+    } else if (kPolicy.input == InputStage::Stereo) {
         makeStereo(inLeft, inRight, frames, stride);
         filterStereo(monoBuffer.get(), frames);
     }
     startMeter();
     (this->*kFrames)(outLeft, outRight, inLeft, inRight, frames, stride, accumulate);
     finishMeter();
-    if (Policy::kFlushNetworkStates) flushKernelStates();
-    if (Policy::kEnd == EndOfStream::ResponseLength) return countedLength(frames, flush);
+    if (kPolicy.flushNetworkStates) flushKernelStates();
+    if (kPolicy.end == EndOfStream::ResponseLength) return countedLength(frames, flush);
     return trimmedLength(outLeft, outRight, frames, stride);
 }
 

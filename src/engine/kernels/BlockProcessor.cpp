@@ -190,17 +190,12 @@ int ReverbEngine::ProcessBlock(float* outLeft, float* outRight, const float* inL
 
 namespace {
 // A mode whose network does not exist (yet) passes the dry signal; nothing in a line holds the tail.
-struct DryBlock {
-    static constexpr bool kMeterBeforeLatch = false;
-    static constexpr EndOfStream kEnd = EndOfStream::PreDelayNever;
-    static constexpr InputStage kInput = InputStage::None;
-    static constexpr bool kFlushNetworkStates = false;
-};
+constexpr BlockPolicy kDryBlock = {false, EndOfStream::PreDelayNever, InputStage::None, false};
 }  // namespace
 
 int ReverbEngine::processDry(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                              int frames, int stride, int accumulate, int flush) {
-    return RunBlock<DryBlock, &ReverbEngine::dryFrames>(outLeft, outRight, inLeft, inRight, frames, stride,
+    return RunBlock<kDryBlock, &ReverbEngine::dryFrames>(outLeft, outRight, inLeft, inRight, frames, stride,
                                                         accumulate, flush);
 }
 

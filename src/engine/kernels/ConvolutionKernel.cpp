@@ -26,18 +26,13 @@ constexpr int32_t kWorkerPartition = 4096;
 
 // The convolution meters before latching the flush flag, runs its own input stage per frame (stereo, in
 // double precision), and ends the stream by counting out its response.
-struct ConvolutionBlock {
-    static constexpr bool kMeterBeforeLatch = true;
-    static constexpr EndOfStream kEnd = EndOfStream::ResponseLength;
-    static constexpr InputStage kInput = InputStage::None;
-    static constexpr bool kFlushNetworkStates = false;
-};
+constexpr BlockPolicy kConvolutionBlock = {true, EndOfStream::ResponseLength, InputStage::None, false};
 
 }  // namespace
 
 int ReverbEngine::processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                      int frames, int stride, int accumulate, int flush) {
-    return RunBlock<ConvolutionBlock, &ReverbEngine::convolutionFrames>(outLeft, outRight, inLeft, inRight, frames,
+    return RunBlock<kConvolutionBlock, &ReverbEngine::convolutionFrames>(outLeft, outRight, inLeft, inRight, frames,
                                                                         stride, accumulate, flush);
 }
 

@@ -24,19 +24,14 @@ int ReverbEngine::processEcho(float* outLeft, float* outRight, const float* inLe
 namespace {
 // The echo meters before latching the flush flag; its memory, the pre-delay line, is always in the path.
 // The input stage stays stereo: gain, then the three filter sections with a state per channel.
-struct EchoBlock {
-    static constexpr bool kMeterBeforeLatch = true;
-    static constexpr EndOfStream kEnd = EndOfStream::PreDelayAlways;
-    static constexpr InputStage kInput = InputStage::Stereo;
-    static constexpr bool kFlushNetworkStates = true;
-};
+constexpr BlockPolicy kEchoBlock = {true, EndOfStream::PreDelayAlways, InputStage::Stereo, true};
 }  // namespace
 
 template <Reads kReads>
 int ReverbEngine::runEcho(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                           int stride, int accumulate, int flush) {
-    return RunBlock<EchoBlock, &ReverbEngine::echoFrames<kReads>>(outLeft, outRight, inLeft, inRight, frames,
-                                                                  stride, accumulate, flush);
+    return RunBlock<kEchoBlock, &ReverbEngine::echoFrames<kReads>>(outLeft, outRight, inLeft, inRight, frames,
+                                                                   stride, accumulate, flush);
 }
 
 template <Reads kReads>

@@ -18,19 +18,15 @@ int ReverbEngine::processExtendedPlate(float* outLeft, float* outRight, const fl
 
 namespace {
 // These plates meter before latching the flush flag; the pre-delay line holds the tail while it is on.
-struct ExtendedPlateBlock {
-    static constexpr bool kMeterBeforeLatch = true;
-    static constexpr EndOfStream kEnd = EndOfStream::PreDelayWhenOn;
-    static constexpr InputStage kInput = InputStage::Mono;
-    static constexpr bool kFlushNetworkStates = true;
-};
+constexpr BlockPolicy kExtendedPlateBlock = {true, EndOfStream::PreDelayWhenOn, InputStage::Mono, true};
 }  // namespace
 
 template <Reads kReads>
 int ReverbEngine::runExtendedPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                    int frames, int stride, int accumulate, int flush) {
     constexpr KernelFrames kFrames = &ReverbEngine::extendedPlateFrames<kReads>;
-    return RunBlock<ExtendedPlateBlock, kFrames>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    return RunBlock<kExtendedPlateBlock, kFrames>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate,
+                                                  flush);
 }
 
 template <Reads kReads>

@@ -41,19 +41,14 @@ int ReverbEngine::processPlate(float* outLeft, float* outRight, const float* inL
 
 namespace {
 // The flush latch comes first; the pre-delay line holds the tail while "Pre Delay" is on.
-struct PlateBlock {
-    static constexpr bool kMeterBeforeLatch = false;
-    static constexpr EndOfStream kEnd = EndOfStream::PreDelayWhenOn;
-    static constexpr InputStage kInput = InputStage::Mono;
-    static constexpr bool kFlushNetworkStates = true;
-};
+constexpr BlockPolicy kPlateBlock = {false, EndOfStream::PreDelayWhenOn, InputStage::Mono, true};
 }  // namespace
 
 template <Reads kDiffusers, Reads kTank>
 int ReverbEngine::runPlate(float* outLeft, float* outRight, const float* inLeft, const float* inRight, int frames,
                            int stride, int accumulate, int flush) {
     constexpr KernelFrames kFrames = &ReverbEngine::plateFrames<kDiffusers, kTank>;
-    return RunBlock<PlateBlock, kFrames>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
+    return RunBlock<kPlateBlock, kFrames>(outLeft, outRight, inLeft, inRight, frames, stride, accumulate, flush);
 }
 
 template <Reads kDiffusers, Reads kTank>
