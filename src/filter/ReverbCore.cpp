@@ -156,7 +156,7 @@ void ReverbCore::parameterChanged(int32_t id, float position) {
 }
 
 bool ReverbCore::preparedResponse(std::vector<float>& left, std::vector<float>& right) {
-    MutexLock g(lock_);
+    Guard g(*this);
     return engine_.PreparedResponse(left, right);
 }
 
