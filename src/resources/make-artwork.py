@@ -41,7 +41,7 @@ NEEDLE_PIVOT = (60, 86)
 NEEDLE_ALPHA = math.pi * 0.3055555522441864
 METER_GAIN = 2.235730360023138
 SCALE_MARKS = [None, -25, -15, -9, -6, -3, 0, 6]  # None is minus infinity
-MINOR_MARKS = [-40, -30, -20, -12, -10, -8]
+MINOR_MARKS = [-30, -20, -12, -10, -8]
 
 # Glyph strips: 77 characters in strip order (the comma before the plus sign) and their cell widths (pixels).
 CHARSET = " !\"&'()*,+-./0123456789:?ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz"
@@ -313,19 +313,23 @@ def meter_face():
         red = len(marks) > 1 or (marks[0] is not None and marks[0] >= -6)
         a = math.radians(deg)
         if len(marks) == 1:
-            x, y = polar(a, 73)
-            tw = fnt.getlength(texts[0])
-            d.text((round(x - tw / 2), round(y - 5)), texts[0], font=font(SANS_BOLD if marks[0] is None else COND_BOLD, 8),
-                   fill=SCALE_RED if red else SCALE_INK)
+            fnt_mark = font(SANS_BOLD, 10) if marks[0] is None else fnt
+            x, y = polar(a, 74 if marks[0] is None else 73)
+            tw = fnt_mark.getlength(texts[0])
+            d.text((round(x - tw / 2), round(y - 6)), texts[0], font=fnt_mark, fill=SCALE_RED if red else SCALE_INK)
         else:
             # The end stop: every level from -7 dBFS up reads here, listed top down.
             for i, t in enumerate(reversed(texts)):
                 tw = fnt.getlength(t)
                 d.text((round(112 - tw), 4 + i * 7), t, font=fnt, fill=SCALE_RED)
     d.text((12, 44), "dBFS", font=font(COND_BOLD, 8), fill=SCALE_INK)
+    # The needle's pivot housing, below the part of the face where the needle shows.
+    px, py = NEEDLE_PIVOT
+    d.pieslice([px - 14, py - 14, px + 14, py + 14], 180, 360, fill=(58, 62, 68), outline=(90, 95, 102))
+    d.ellipse([px - 3, py - 3, px + 3, py + 3], fill=(20, 21, 23))
     small = font(COND_BOLD, 7)
     tw = spaced_width("PEAK LEVEL", small, 1)
-    draw_spaced(d, (round((w - tw) / 2), 67), "PEAK LEVEL", small, INK_DIM, 1)
+    draw_spaced(d, (round((w - tw) / 2), 90), "PEAK LEVEL", small, INK_DIM, 1)
     d.line([(2, 61), (w - 3, 61)], fill=(150, 140, 118))
     d.rounded_rectangle([0, 0, w - 1, h - 1], radius=5, outline=PANEL_EDGE_LO)
     d.line([(2, 62), (w - 3, 62)], fill=PANEL_EDGE_LO)
