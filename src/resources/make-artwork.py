@@ -225,7 +225,8 @@ def source_strip():
     for frame in range(3):
         for zone, name in enumerate(("IN", "OUT", "VERB")):
             lit = zone == frame
-            cell = vertical_gradient(36, 15, (122, 86, 32) if lit else (62, 66, 72), (64, 40, 10) if lit else PANEL_DARK)
+            top, bottom = ((122, 86, 32), (64, 40, 10)) if lit else ((62, 66, 72), PANEL_DARK)
+            cell = vertical_gradient(36, 15, top, bottom)
             bevel(cell)
             if lit:
                 ImageDraw.Draw(cell).line([(4, 12), (31, 12)], fill=AMBER)
@@ -425,49 +426,49 @@ def resources():
     grey = "L"
     rgb = "RGB"
     table = [
-        # id, file name, picture
-        (175, "font-large", glyph_strip(LARGE_WIDTHS, 11, 10, 9, SANS)),
-        (178, "return-button", return_button()),
-        (179, "return-button-mask", return_button_mask()),
-        (186, "thumb-vertical", thumb_vertical()),
-        (187, "thumb-horizontal", thumb_horizontal()),
-        (188, "thumb-vertical-mask", rounded_mask(22, 15, 3)),
-        (189, "thumb-horizontal-mask", rounded_mask(15, 22, 3)),
-        (193, "font-small", glyph_strip(SMALL_WIDTHS, 9, 8.5, 7, SANS)),
-        (196, "about-background", about_background()),
-        (202, "groove-vertical", groove(112, True)),
-        (203, "groove-horizontal", groove(112, False)),
-        (204, "display-frame", display_frame()),
-        (205, "meter-face", meter_face()),
-        (206, "label-wet", nameplate(34, 13, "WET")),
-        (207, "label-damping", vertical_label("DAMPING")),
-        (208, "label-decay", vertical_label("DECAY")),
-        (209, "label-diffuse", vertical_label("DIFFUSE")),
-        (210, "label-dry", nameplate(34, 13, "DRY")),
-        (211, "label-reflections", vertical_label("REFLECTIONS")),
-        (212, "label-output-levels", nameplate(119, 14, "OUTPUT LEVELS")),
-        (213, "label-predelay", vertical_label("PREDELAY")),
-        (214, "label-room-size", vertical_label("ROOM SIZE")),
-        (215, "label-colour", nameplate(119, 14, "COLOUR")),
-        (216, "label-input", vertical_label("INPUT")),
-        (218, "page-button-2-lit", page_button("2", True)),
-        (219, "page-button-1-lit", page_button("1", True)),
-        (220, "page-button-2-dim", page_button("2", False)),
-        (221, "page-button-1-dim", page_button("1", False)),
-        (222, "algorithm-box", algorithm_box()),
-        (223, "label-high-cut", vertical_label("HIGH CUT")),
-        (224, "label-low-cut", vertical_label("LOW CUT")),
-        (225, "label-notch-freq", vertical_label("NOTCH FREQ")),
-        (226, "label-notch-gain", vertical_label("NOTCH GAIN")),
-        (227, "label-notch-q", vertical_label("NOTCH Q")),
-        (228, "meter-source", source_strip()),
-        (229, "load-bar", load_bar_trough()),
-        (230, "logo-mask", logo_cover),
-        (231, "logo", logo_colour),
-        (233, "label-page", nameplate(28, 12, "PAGE", size=8, spacing=1)),
+        # id, file name, width, height, bits per pixel (8: grey with a grey palette; 24: colour), picture
+        (175, "font-large", 457, 11, 8, glyph_strip(LARGE_WIDTHS, 11, 10, 9, SANS)),
+        (178, "return-button", 100, 20, 24, return_button()),
+        (179, "return-button-mask", 100, 20, 8, return_button_mask()),
+        (186, "thumb-vertical", 22, 15, 24, thumb_vertical()),
+        (187, "thumb-horizontal", 15, 22, 24, thumb_horizontal()),
+        (188, "thumb-vertical-mask", 22, 15, 8, rounded_mask(22, 15, 3)),
+        (189, "thumb-horizontal-mask", 15, 22, 8, rounded_mask(15, 22, 3)),
+        (193, "font-small", 383, 9, 8, glyph_strip(SMALL_WIDTHS, 9, 8.5, 7, SANS)),
+        (196, "about-background", 750, 167, 24, about_background()),
+        (202, "groove-vertical", 3, 112, 24, groove(112, True)),
+        (203, "groove-horizontal", 112, 3, 24, groove(112, False)),
+        (204, "display-frame", 38, 17, 24, display_frame()),
+        (205, "meter-face", 118, 103, 24, meter_face()),
+        (206, "label-wet", 34, 13, 24, nameplate(34, 13, "WET")),
+        (207, "label-damping", 14, 119, 24, vertical_label("DAMPING")),
+        (208, "label-decay", 14, 119, 24, vertical_label("DECAY")),
+        (209, "label-diffuse", 14, 119, 24, vertical_label("DIFFUSE")),
+        (210, "label-dry", 34, 13, 24, nameplate(34, 13, "DRY")),
+        (211, "label-reflections", 14, 119, 24, vertical_label("REFLECTIONS")),
+        (212, "label-output-levels", 119, 14, 24, nameplate(119, 14, "OUTPUT LEVELS")),
+        (213, "label-predelay", 14, 119, 24, vertical_label("PREDELAY")),
+        (214, "label-room-size", 14, 119, 24, vertical_label("ROOM SIZE")),
+        (215, "label-colour", 119, 14, 24, nameplate(119, 14, "COLOUR")),
+        (216, "label-input", 14, 119, 24, vertical_label("INPUT")),
+        (218, "page-button-2-lit", 13, 12, 24, page_button("2", True)),
+        (219, "page-button-1-lit", 13, 12, 24, page_button("1", True)),
+        (220, "page-button-2-dim", 13, 12, 24, page_button("2", False)),
+        (221, "page-button-1-dim", 13, 12, 24, page_button("1", False)),
+        (222, "algorithm-box", 119, 14, 24, algorithm_box()),
+        (223, "label-high-cut", 14, 119, 24, vertical_label("HIGH CUT")),
+        (224, "label-low-cut", 14, 119, 24, vertical_label("LOW CUT")),
+        (225, "label-notch-freq", 14, 119, 24, vertical_label("NOTCH FREQ")),
+        (226, "label-notch-gain", 14, 119, 24, vertical_label("NOTCH GAIN")),
+        (227, "label-notch-q", 14, 119, 24, vertical_label("NOTCH Q")),
+        (228, "meter-source", 324, 15, 24, source_strip()),
+        (229, "load-bar", 119, 4, 24, load_bar_trough()),
+        (230, "logo-mask", 131, 26, 8, logo_cover),
+        (231, "logo", 131, 26, 24, logo_colour),
+        (233, "label-page", 28, 12, 24, nameplate(28, 12, "PAGE", size=8, spacing=1)),
     ]
-    for _, _, img in table:
-        assert img.mode in (grey, rgb)
+    for rid, _, w, h, bits, img in table:
+        assert img.size == (w, h) and img.mode == (grey if bits == 8 else rgb), rid
     return table
 
 
@@ -497,7 +498,7 @@ def bmp_bytes(img):
 def main(out_dir):
     os.makedirs(out_dir, exist_ok=True)
     lines = ["// Bitmap resources of the editor, written by make-artwork.py.", ""]
-    for rid, name, img in resources():
+    for rid, name, _, _, _, img in resources():
         fname = "%d-%s.bmp" % (rid, name)
         with open(os.path.join(out_dir, fname), "wb") as f:
             f.write(bmp_bytes(img))
