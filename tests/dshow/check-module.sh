@@ -1,5 +1,6 @@
 #!/usr/bin/env bash
-# Checks the import and export tables of Ulvetta.ax: system DLLs only, and the four COM server exports.
+# Checks the import and export tables of Ulvetta.ax (system DLLs only, the four COM server exports) and that
+# it carries its resources.
 set -euo pipefail
 module="$1"
 dump=$(x86_64-w64-mingw32-objdump -p "$module")
@@ -16,6 +17,10 @@ exports=$(printf '%s\n' "$dump" | sed -n '/\[Ordinal\/Name Pointer\] Table/,/^$/
 expected="DllCanUnloadNow DllGetClassObject DllRegisterServer DllUnregisterServer "
 if [ "$exports" != "$expected" ]; then
   echo "Ulvetta.ax exports '$exports', expected '$expected'"
+  status=1
+fi
+if ! x86_64-w64-mingw32-objdump -h "$module" | grep -q '\.rsrc'; then
+  echo "Ulvetta.ax has no resource section"
   status=1
 fi
 [ $status -eq 0 ] && echo "imports: $imports; exports: $exports"
