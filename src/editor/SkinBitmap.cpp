@@ -4,6 +4,7 @@
 #include <cstring>
 #include <fstream>
 #include <new>
+#include <type_traits>
 
 namespace ulvetta {
 namespace {
@@ -56,6 +57,16 @@ void forEachPixel(const SkinBitmap& bitmap, DibSurface* surface, int dx, int dy,
   }
 }
 
+// Calls body(std::true_type) for an 8-bit bitmap and body(std::false_type) for a 24-bit one, so that each
+// pixel loop is compiled for one depth.
+template <typename Body>
+void byDepth(int bits, Body body) {
+  if (bits == 8)
+    body(std::true_type{});
+  else
+    body(std::false_type{});
+}
+
 // The blending rule of partial weights: weight w in 0..256 of colour c over destination d.
 inline uint8_t blend(uint8_t d, uint8_t c, int w) { return static_cast<uint8_t>((d * (256 - w) + c * w) >> 8); }
 
@@ -67,11 +78,6 @@ void setDefaultResourceLookup(ResourceLookup lookup) { gResourceLookup = lookup;
 void SkinBitmap::size(int* width, int* height) const {
   if (width) *width = width_;
   if (height) *height = height_;
-}
-
-uint8_t SkinBitmap::grey(int x, int y) const {
-  const uint8_t* p = pixel(x, y);
-  return bits_ == 8 ? palette_[p[0] * 4] : p[1];
 }
 
 bool SkinBitmap::pixelColour(int x, int y, SkinColour* out) const {
@@ -101,46 +107,52 @@ EditorRect SkinBitmap::opaqueBounds() const {
 }
 
 void SkinBitmap::copy(DibSurface* surface, int dx, int dy, int w, int h, int sx, int sy) const {
-  forEachPixel(*this, surface, dx, dy, w, h, sx, sy, nullptr, [this](uint8_t* out, int x, int y) {
-    const uint8_t* p = pixel(x, y);
-    if (bits_ == 8) p = &palette_[p[0] * 4];
-    out[0] = p[0];
-    out[1] = p[1];
-    out[2] = p[2];
+  byDepth(bits_, [&](auto eight) {
+    forEachPixel(*this, surface, dx, dy, w, h, sx, sy, nullptr, [&](uint8_t* out, int x, int y) {
+      const uint8_t* p = colourAt<eight>(x, y);
+      out[0] = p[0];
+      out[1] = p[1];
+      out[2] = p[2];
+    });
   });
 }
 
 void SkinBitmap::tintedCopy(DibSurface* surface, int dx, int dy, int w, int h, int sx, int sy,
                             SkinColour colour) const {
-  forEachPixel(*this, surface, dx, dy, w, h, sx, sy, nullptr, [this, colour](uint8_t* out, int x, int y) {
-    int weight = grey(x, y) + 1;
-    out[0] = blend(out[0], colour.b, weight);
-    out[1] = blend(out[1], colour.g, weight);
-    out[2] = blend(out[2], colour.r, weight);
+  byDepth(bits_, [&](auto eight) {
+    forEachPixel(*this, surface, dx, dy, w, h, sx, sy, nullptr, [&](uint8_t* out, int x, int y) {
+      const int weight = greyAt<eight>(x, y) + 1;
+      out[0] = blend(out[0], colour.b, weight);
+      out[1] = blend(out[1], colour.g, weight);
+      out[2] = blend(out[2], colour.r, weight);
+    });
   });
 }
 
 void SkinBitmap::tintedCopyAlpha(DibSurface* surface, int dx, int dy, int w, int h, int sx, int sy,
                                  SkinColour colour, int alpha) const {
   alpha = std::clamp(alpha, 0, 255);
-  // 8-bit glyphs count grey g as g + 1 so that full coverage at full alpha reaches weight 256.
-  int bias = bits_ == 8 ? 1 : 0;
-  forEachPixel(*this, surface, dx, dy, w, h, sx, sy, nullptr, [&](uint8_t* out, int x, int y) {
-    int weight = (grey(x, y) + bias) * alpha / 255;
-    out[0] = blend(out[0], colour.b, weight);
-    out[1] = blend(out[1], colour.g, weight);
-    out[2] = blend(out[2], colour.r, weight);
+  byDepth(bits_, [&](auto eight) {
+    // 8-bit glyphs count grey g as g + 1 so that full coverage at full alpha reaches weight 256.
+    constexpr int bias = decltype(eight)::value ? 1 : 0;
+    forEachPixel(*this, surface, dx, dy, w, h, sx, sy, nullptr, [&](uint8_t* out, int x, int y) {
+      const int weight = (greyAt<eight>(x, y) + bias) * alpha / 255;
+      out[0] = blend(out[0], colour.b, weight);
+      out[1] = blend(out[1], colour.g, weight);
+      out[2] = blend(out[2], colour.r, weight);
+    });
   });
 }
 
 void SkinBitmap::maskedCopy(DibSurface* surface, int dx, int dy, int w, int h, int sx, int sy,
                             const SkinBitmap* mask) const {
   if (!mask) return;
-  forEachPixel(*this, surface, dx, dy, w, h, sx, sy, mask, [this, mask](uint8_t* out, int x, int y) {
-    double m = mask->grey(x, y) / 255.0;
-    const uint8_t* p = pixel(x, y);
-    if (bits_ == 8) p = &palette_[p[0] * 4];
-    for (int k = 0; k < 3; ++k) out[k] = static_cast<uint8_t>(p[k] * m + out[k] * (1.0 - m));
+  byDepth(bits_, [&](auto eight) {
+    forEachPixel(*this, surface, dx, dy, w, h, sx, sy, mask, [&](uint8_t* out, int x, int y) {
+      const double m = mask->grey(x, y) / 255.0;
+      const uint8_t* p = colourAt<eight>(x, y);
+      for (int k = 0; k < 3; ++k) out[k] = static_cast<uint8_t>(p[k] * m + out[k] * (1.0 - m));
+    });
   });
 }
 

@@ -63,7 +63,7 @@ class SkinBitmap {
   int bitsPerPixel() const { return bits_; }
   int stride() const { return stride_; }
   // Grey level of (x, y): the first palette byte for 8-bit bitmaps, the middle byte for 24-bit ones.
-  uint8_t grey(int x, int y) const;
+  uint8_t grey(int x, int y) const { return bits_ == 8 ? greyAt<true>(x, y) : greyAt<false>(x, y); }
 
  private:
   // Parses a header, palette and rows; pixelOffset is where the rows start in data, or 0 when they follow
@@ -71,6 +71,17 @@ class SkinBitmap {
   bool parse(const uint8_t* data, size_t size, size_t pixelOffset);
   const uint8_t* pixel(int x, int y) const {
     return rows_.data() + static_cast<size_t>(y) * stride_ + static_cast<size_t>(x) * (bits_ / 8);
+  }
+
+  // B, G, R of (x, y) and its grey level, for a bitmap known to be 8-bit (Eight) or 24-bit.
+  template <bool Eight>
+  const uint8_t* colourAt(int x, int y) const {
+    const uint8_t* p = pixel(x, y);
+    return Eight ? &palette_[p[0] * 4] : p;
+  }
+  template <bool Eight>
+  uint8_t greyAt(int x, int y) const {
+    return Eight ? palette_[pixel(x, y)[0] * 4] : pixel(x, y)[1];
   }
 
   ResourceLookup lookup_;

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <cstring>
 #include <utility>
 
 namespace ulvetta {
@@ -14,12 +15,15 @@ void fillRect(DibSurface* surface, int x, int y, int w, int h, SkinColour colour
   const long long bottom = std::min<long long>(static_cast<long long>(y) + h, surface->height());
   const int weight = colour.a + 1;
   const uint8_t c[3] = {colour.b, colour.g, colour.r};
+  const uint32_t opaque = colour.b | (colour.g << 8) | (colour.r << 16);
   for (long long j = top; j < bottom; ++j) {
     uint8_t* p = surface->at(static_cast<int>(left), static_cast<int>(j));
-    for (long long i = left; i < right; ++i, p += 4) {
-      for (int k = 0; k < 3; ++k)
-        p[k] = colour.a == 255 ? c[k] : static_cast<uint8_t>((p[k] * (256 - weight) + c[k] * weight) >> 8);
+    if (colour.a == 255) {
+      for (long long i = left; i < right; ++i, p += 4) std::memcpy(p, &opaque, 4);
+      continue;
     }
+    for (long long i = left; i < right; ++i, p += 4)
+      for (int k = 0; k < 3; ++k) p[k] = static_cast<uint8_t>((p[k] * (256 - weight) + c[k] * weight) >> 8);
   }
 }
 
