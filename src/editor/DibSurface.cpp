@@ -2,6 +2,8 @@
 
 #include <new>
 
+#include "editor/OctreeQuantiser.h"
+
 namespace ulvetta {
 
 bool DibSurface::create(int x, int y, int width, int height, int bits) {
@@ -26,8 +28,18 @@ bool DibSurface::create(int x, int y, int width, int height, int bits) {
 
 void DibSurface::release() {
   std::vector<uint8_t>().swap(pixels_);
+  palette_.clear();
   x_ = y_ = width_ = height_ = 0;
   header_ = DibHeader{};
+}
+
+const std::vector<SkinColour>& DibSurface::displayPalette() {
+  if (palette_.empty() && !empty()) {
+    OctreeQuantiser quantiser;
+    quantiser.addSurface(*this);
+    palette_ = quantiser.palette();
+  }
+  return palette_;
 }
 
 }  // namespace ulvetta

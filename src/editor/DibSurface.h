@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "editor/SkinColour.h"
+
 namespace ulvetta {
 
 // The device-independent bitmap header that describes a surface to the window system (40 bytes).
@@ -38,6 +40,10 @@ class DibSurface {
   int stride() const { return width_ * 4; }  // bytes per row
   const DibHeader& header() const { return header_; }
 
+  // The palette for 8-bit palette displays: at most 236 colours chosen from the contents at the first call,
+  // then kept until the surface is released or created again.
+  const std::vector<SkinColour>& displayPalette();
+
   uint8_t* pixels() { return pixels_.data(); }
   const uint8_t* pixels() const { return pixels_.data(); }
   // The first byte (blue) of pixel (px, py); the caller keeps inside the surface.
@@ -50,6 +56,7 @@ class DibSurface {
   int x_ = 0, y_ = 0, width_ = 0, height_ = 0;
   DibHeader header_;
   std::vector<uint8_t> pixels_;
+  std::vector<SkinColour> palette_;
 };
 
 }  // namespace ulvetta

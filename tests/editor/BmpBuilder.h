@@ -21,7 +21,7 @@ struct BmpSpec {
 };
 
 inline void put(std::vector<uint8_t>& out, uint32_t v, int bytes) {
-  for (int i = 0; i < bytes; ++i) out.push_back(static_cast<uint8_t>(v >> (8 * i)));
+  for (int i = 0; i < bytes; ++i) out.push_back(i < 4 ? static_cast<uint8_t>(v >> (8 * i)) : 0);
 }
 
 inline std::vector<uint8_t> makeDib(const BmpSpec& s) {

@@ -1,0 +1,63 @@
+// The headless presenter: the written PNG read back with libpng, and no file at all when writing fails.
+#include <gtest/gtest.h>
+#include <png.h>
+
+#include <cstdio>
+#include <cstring>
+#include <filesystem>
+#include <vector>
+
+#include "editor/headless/PngPresenter.h"
+
+namespace ulvetta {
+namespace {
+
+TEST(PngPresenterTest, WritesTheRectangleAndNothingOnFailure) {
+  DibSurface surface;
+  ASSERT_TRUE(surface.create(0, 0, 7, 5));
+  for (int y = 0; y < 5; ++y)
+    for (int x = 0; x < 7; ++x) {
+      uint8_t* p = surface.at(x, y);
+      p[0] = uint8_t(x * 30);  // blue
+      p[1] = uint8_t(y * 40);  // green
+      p[2] = 99;               // red
+    }
+  const std::string path = testing::TempDir() + "editor_present.png";
+  PngPresenter presenter(path);
+  ASSERT_TRUE(presenter.present(surface, 2, 1, 10, 3)) << presenter.error();  // clipped to 5 x 3
+
+  png_image image;
+  std::memset(&image, 0, sizeof image);
+  image.version = PNG_IMAGE_VERSION;
+  ASSERT_TRUE(png_image_begin_read_from_file(&image, path.c_str()));
+  image.format = PNG_FORMAT_RGB;
+  std::vector<uint8_t> rgb(PNG_IMAGE_SIZE(image));
+  ASSERT_TRUE(png_image_finish_read(&image, nullptr, rgb.data(), 0, nullptr));
+  ASSERT_EQ(image.width, 5u);
+  ASSERT_EQ(image.height, 3u);
+  for (int y = 0; y < 3; ++y)
+    for (int x = 0; x < 5; ++x) {
+      const uint8_t* p = &rgb[(y * 5 + x) * 3];
+      EXPECT_EQ(p[0], 99);
+      EXPECT_EQ(p[1], (y + 1) * 40);
+      EXPECT_EQ(p[2], (x + 2) * 30);
+    }
+  std::remove(path.c_str());
+
+  const std::string dir = testing::TempDir() + "editor_present_dir";
+  std::filesystem::create_directories(dir);
+  PngPresenter blocked(dir);  // a directory cannot be replaced by a file
+  EXPECT_FALSE(blocked.present(surface, 0, 0, 7, 5));
+  EXPECT_FALSE(blocked.error().empty());
+  EXPECT_TRUE(std::filesystem::is_directory(dir));
+  for (const auto& entry : std::filesystem::directory_iterator(testing::TempDir()))
+    EXPECT_EQ(entry.path().filename().string().rfind("editor_present_dir.", 0), std::string::npos);
+  PngPresenter nowhere(testing::TempDir() + "no/such/dir/x.png");
+  EXPECT_FALSE(nowhere.present(surface, 0, 0, 7, 5));
+  EXPECT_FALSE(PngPresenter(path).present(surface, 7, 0, 3, 3));
+  EXPECT_FALSE(std::filesystem::exists(path));
+  std::filesystem::remove(dir);
+}
+
+}  // namespace
+}  // namespace ulvetta
