@@ -8,15 +8,12 @@ namespace ulvetta::test {
 
 struct BmpSpec {
   int headerSize = 40;  // 12 (core) or 40 (info)
-  int width = 2;
-  int height = 2;  // negative for top-down rows
-  int bits = 24;
-  int planes = 1;
-  uint32_t compression = 0;
-  uint32_t colours = 0;  // palette entries written (info header: also the stored count)
-  // Value of (x, y, channel) with y counted from the top; channel 0 for 8-bit indices, 0..2 = B, G, R.
+  int width = 2, height = 2;  // negative height: top-down rows
+  int bits = 8;
+  uint32_t colours = 256;  // palette entries written (info header: also the stored count)
+  // Byte `channel` of pixel (x, y), y from the top: the index of an 8-bit pixel, else B, G, R.
   std::function<uint8_t(int x, int y, int channel)> pixel = [](int, int, int) { return uint8_t{0}; };
-  // Palette entry i, channel 0..2 = B, G, R.
+  // Channel 0..2 (B, G, R) of palette entry i: grey i unless set.
   std::function<uint8_t(int i, int channel)> palette = [](int i, int) { return static_cast<uint8_t>(i); };
 };
 
@@ -26,58 +23,45 @@ inline void put(std::vector<uint8_t>& out, uint32_t v, int bytes) {
 
 inline std::vector<uint8_t> makeDib(const BmpSpec& s) {
   std::vector<uint8_t> out;
+  const int field = s.headerSize == 12 ? 2 : 4;
   put(out, static_cast<uint32_t>(s.headerSize), 4);
-  const int rows = s.height < 0 ? -s.height : s.height;
-  if (s.headerSize == 12) {
-    put(out, static_cast<uint32_t>(s.width), 2);
-    put(out, static_cast<uint32_t>(s.height), 2);
-    put(out, static_cast<uint32_t>(s.planes), 2);
-    put(out, static_cast<uint32_t>(s.bits), 2);
-  } else {
-    put(out, static_cast<uint32_t>(s.width), 4);
-    put(out, static_cast<uint32_t>(s.height), 4);
-    put(out, static_cast<uint32_t>(s.planes), 2);
-    put(out, static_cast<uint32_t>(s.bits), 2);
-    put(out, s.compression, 4);
-    put(out, 0, 12);
+  put(out, static_cast<uint32_t>(s.width), field);
+  put(out, static_cast<uint32_t>(s.height), field);
+  put(out, 1, 2);
+  put(out, static_cast<uint32_t>(s.bits), 2);
+  if (s.headerSize == 40) {
+    put(out, 0, 16);  // no compression, image size, resolution
     put(out, s.colours, 4);
     put(out, 0, 4);
   }
-  for (uint32_t i = 0; i < s.colours; ++i) {
-    for (int c = 0; c < 3; ++c) out.push_back(s.palette(static_cast<int>(i), c));
-    if (s.headerSize != 12) out.push_back(0);
-  }
-  const int bytesPerPixel = s.bits >= 8 ? s.bits / 8 : 1;
-  const size_t stride = (static_cast<size_t>(s.width) * s.bits + 31) / 32 * 4;
+  for (uint32_t i = 0; i < s.colours; ++i)
+    for (int c = 0; c < (s.headerSize == 12 ? 3 : 4); ++c) out.push_back(c < 3 ? s.palette(int(i), c) : 0);
+  const int rows = s.height < 0 ? -s.height : s.height, bytes = s.bits >= 8 ? s.bits / 8 : 1;
+  const size_t stride = (size_t(s.width) * s.bits + 31) / 32 * 4;
   for (int r = 0; r < rows; ++r) {
-    const int y = s.height < 0 ? r : rows - 1 - r;  // stored order to picture row
     std::vector<uint8_t> row(stride, 0);
-    for (int x = 0; x < s.width && static_cast<size_t>(x * bytesPerPixel) < stride; ++x)
-      for (int c = 0; c < bytesPerPixel; ++c) row[x * bytesPerPixel + c] = s.pixel(x, y, c);
+    for (size_t x = 0; x < size_t(s.width) && x * bytes < stride; ++x)
+      for (int c = 0; c < bytes; ++c) row[x * bytes + c] = s.pixel(int(x), s.height < 0 ? r : rows - 1 - r, c);
     out.insert(out.end(), row.begin(), row.end());
   }
   return out;
 }
 
-// A BMP file: "BM", the file size, and the rows' offset after the header and palette.
+// A BMP file: "BM", its size, and the rows' offset after the header and palette.
 inline std::vector<uint8_t> makeFile(const BmpSpec& s) {
   const std::vector<uint8_t> dib = makeDib(s);
-  const uint32_t paletteBytes = s.colours * (s.headerSize == 12 ? 3 : 4);
   std::vector<uint8_t> out{'B', 'M'};
-  put(out, static_cast<uint32_t>(14 + dib.size()), 4);
-  put(out, 0, 4);
-  put(out, 14 + static_cast<uint32_t>(s.headerSize) + paletteBytes, 4);
+  put(out, static_cast<uint32_t>(14 + dib.size()), 8);
+  put(out, 14 + s.headerSize + s.colours * (s.headerSize == 12 ? 3 : 4), 4);
   out.insert(out.end(), dib.begin(), dib.end());
   return out;
 }
 
-// An 8-bit bitmap of grey levels: palette entry i is grey i, and pixel (x, y) has index level(x, y).
+// An 8-bit grey picture: palette entry i is grey i and pixel (x, y) has index level(x, y).
 inline BmpSpec greyBitmap(int width, int height, std::function<uint8_t(int, int)> level) {
   BmpSpec s;
   s.width = width;
   s.height = height;
-  s.bits = 8;
-  s.colours = 256;
   s.pixel = [level](int x, int y, int) { return level(x, y); };
   return s;
 }

@@ -8,86 +8,60 @@
 namespace ulvetta {
 namespace {
 
-using test::greyBitmap;
-using test::makeDib;
-
 DibSurface greySurface(int w, int h, uint8_t level) {
   DibSurface s;
   EXPECT_TRUE(s.create(0, 0, w, h));
-  for (int i = 0; i < w * h * 4; ++i) s.pixels()[i] = level;
+  std::fill(s.pixels(), s.pixels() + w * h * 4, level);
   return s;
-}
-
-// B, G, R of a pixel packed as 0xRRGGBB.
-uint32_t rgb(const DibSurface& s, int x, int y) {
-  const uint8_t* p = s.at(x, y);
-  return (p[2] << 16) | (p[1] << 8) | p[0];
 }
 
 SkinBitmap loaded(const test::BmpSpec& spec) {
   SkinBitmap b(nullptr);
-  const auto dib = makeDib(spec);
+  const auto dib = test::makeDib(spec);
   EXPECT_TRUE(b.loadDib(dib.data(), dib.size()));
   return b;
 }
 
-TEST(SurfaceTest, HeaderDescribesTopDownRowsAndRefusesBadSizes) {
-  DibSurface s;
-  ASSERT_TRUE(s.create(0, 0, 750, 167));
-  EXPECT_EQ(s.header().size, 40u);
-  EXPECT_EQ(s.header().width, 750);
-  EXPECT_EQ(s.header().height, -167);
-  EXPECT_EQ(s.header().bitCount, 32);
-  EXPECT_EQ(s.header().sizeImage, 750u * 4 * 167);
-  EXPECT_EQ(s.pixels()[750 * 167 * 4 - 1], 0);
-  EXPECT_FALSE(s.create(0, 0, 0, 10));
-  EXPECT_TRUE(s.empty());
-  EXPECT_FALSE(s.create(0, 0, 10, 10, 24));
+// Grey levels 0, 128 and 255 across three pixels.
+const SkinBitmap& threeGreys() {
+  static const SkinBitmap bitmap = loaded(test::greyBitmap(3, 1, [](int x, int) { return uint8_t(x * 128 - x / 2); }));
+  return bitmap;
 }
 
-TEST(FillTest, AlphaZeroHalfAndFullWithClipping) {
+TEST(FillTest, AlphaZeroHalfAndFullClippedToTheSurface) {
   DibSurface s = greySurface(4, 3, 200);
   fillRect(&s, 0, 0, 4, 3, {1, 2, 3, 0});
-  EXPECT_EQ(rgb(s, 1, 1), 0xC8C8C8u);
-  // Weight 129 of 256: (200 x 127 + 100 x 129) >> 8 = 149, (200 x 127 + 0) >> 8 = 99.
+  EXPECT_EQ(s.at(1, 1)[0], 200);
+  // Weight 129/256 of R 100, G 0, B 200 over 200: (200 x 127 + c x 129) >> 8.
   fillRect(&s, 1, 1, 1, 1, {100, 0, 200, 128});
-  EXPECT_EQ(rgb(s, 1, 1), (149u << 16) | (99u << 8) | 200u);
-  // Partly off every edge: only the inside is written.
+  EXPECT_EQ(s.at(1, 1)[2], 149);
+  EXPECT_EQ(s.at(1, 1)[1], 99);
+  EXPECT_EQ(s.at(1, 1)[0], 200);
   fillRect(&s, -5, 2, 100, 100, {10, 20, 30, 255});
-  EXPECT_EQ(rgb(s, 0, 2), 0x0A141Eu);
-  EXPECT_EQ(rgb(s, 3, 2), 0x0A141Eu);
-  EXPECT_EQ(rgb(s, 3, 1), 0xC8C8C8u);
-  fillRect(nullptr, 0, 0, 1, 1, {0, 0, 0, 255});
+  EXPECT_EQ(s.at(0, 2)[2], 10);
+  EXPECT_EQ(s.at(3, 2)[0], 30);
+  EXPECT_EQ(s.at(3, 1)[0], 200);
+  EXPECT_FALSE(s.create(0, 0, 0, 10) || s.create(0, 0, 10, 10, 24));
+  fillRect(&s, 0, 0, 1, 1, {0, 0, 0, 255});
 }
 
 TEST(LineTest, HorizontalVerticalAndDiagonalPixelPairs) {
   const SkinColour c{201, 201, 201, 0};
-  // Horizontal: f = 0 at every step, so the row gets the colour and the row below keeps its own.
+  // At integer positions the first pixel of the pair takes the colour and the second keeps its own.
   DibSurface s = greySurface(6, 6, 100);
   drawLine(&s, 4, 2, 1, 2, c);
-  for (int x = 1; x <= 4; ++x) {
-    EXPECT_EQ(s.at(x, 2)[0], 201) << x;
-    EXPECT_EQ(s.at(x, 3)[0], 100) << x;
-  }
-  EXPECT_EQ(s.at(0, 2)[0], 100);
-  EXPECT_EQ(s.at(5, 2)[0], 100);
+  drawLine(&s, 0, 5, 0, 3, c);
+  for (int k = 1; k <= 4; ++k) EXPECT_TRUE(s.at(k, 2)[0] == 201 && s.at(k, 3)[0] == 100) << k;
+  for (int k = 3; k <= 5; ++k) EXPECT_TRUE(s.at(0, k)[0] == 201 && s.at(1, k)[0] == 100) << k;
+  EXPECT_TRUE(s.at(5, 2)[0] == 100 && s.at(0, 2)[0] == 100);
 
-  s = greySurface(6, 6, 100);
-  drawLine(&s, 3, 0, 3, 4, c);
-  for (int y = 0; y <= 4; ++y) EXPECT_EQ(s.at(3, y)[0], 201) << y;
-  EXPECT_EQ(s.at(3, 5)[0], 100);
-  EXPECT_EQ(s.at(4, 2)[0], 100);
-
-  // Slope 1/2 along x: at odd x the position is halfway, both pixels get 100/2 + 201/2 = 50 + 100.
+  // Slope 1/2 along x: halfway positions give both pixels trunc(100/2) + trunc(201/2) = 150.
   s = greySurface(6, 6, 100);
   drawLine(&s, 4, 2, 0, 0, c);
-  const uint8_t expected[5][2] = {{201, 100}, {150, 150}, {201, 100}, {150, 150}, {201, 100}};
-  const int row[5] = {0, 0, 1, 1, 2};
-  for (int x = 0; x <= 4; ++x) {
-    EXPECT_EQ(s.at(x, row[x])[0], expected[x][0]) << x;
-    EXPECT_EQ(s.at(x, row[x] + 1)[0], expected[x][1]) << x;
-  }
-  // Equal extents count as steep; lines running off the surface draw their inside part only.
+  const int top[5] = {0, 0, 1, 1, 2}, first[5] = {201, 150, 201, 150, 201}, second[5] = {100, 150, 100, 150, 100};
+  for (int x = 0; x <= 4; ++x) EXPECT_TRUE(s.at(x, top[x])[0] == first[x] && s.at(x, top[x] + 1)[0] == second[x]) << x;
+
+  // Equal extents step along y; lines running off the surface draw their inside part only.
   s = greySurface(6, 6, 100);
   drawLine(&s, -3, -3, 8, 8, c);
   for (int k = 0; k < 6; ++k) EXPECT_EQ(s.at(k, k)[0], 201) << k;
@@ -95,63 +69,48 @@ TEST(LineTest, HorizontalVerticalAndDiagonalPixelPairs) {
   EXPECT_EQ(s.at(5, 3)[0], 201);
 }
 
-TEST(TintTest, GreyLevelsWeightTheColour) {
-  // Grey levels 0, 128, 255 of an 8-bit mask over black, tinted with 200.
-  const SkinBitmap mask8 = loaded(greyBitmap(3, 1, [](int x, int) { return uint8_t(x == 0 ? 0 : x == 1 ? 128 : 255); }));
+TEST(TintTest, GreyLevelsWeightTheColourAtSeveralAlphas) {
   const SkinColour tint{200, 200, 200, 255};
-  DibSurface s = greySurface(3, 1, 0);
-  mask8.tintedCopy(&s, 0, 0, 3, 1, 0, 0, tint);
-  // Weight g + 1: 200 x 1 >> 8 = 0, 200 x 129 >> 8 = 100, 200 x 256 >> 8 = 200.
-  EXPECT_EQ(s.at(0, 0)[0], 0);
-  EXPECT_EQ(s.at(1, 0)[0], 100);
-  EXPECT_EQ(s.at(2, 0)[0], 200);
-
-  // With alpha 128 the 8-bit weights are trunc((g + 1) x 128 / 255) = 0, 64, 128.
-  s = greySurface(3, 1, 0);
-  mask8.tintedCopyAlpha(&s, 0, 0, 3, 1, 0, 0, tint, 128);
-  EXPECT_EQ(s.at(0, 0)[0], 0);
-  EXPECT_EQ(s.at(1, 0)[0], 50);
-  EXPECT_EQ(s.at(2, 0)[0], 100);
-  s = greySurface(3, 1, 0);
-  mask8.tintedCopyAlpha(&s, 0, 0, 3, 1, 0, 0, tint, 0);
-  EXPECT_EQ(s.at(2, 0)[0], 0);
-
-  // A 24-bit mask reads the middle byte and uses trunc(g x alpha / 255): weight 255 at full alpha.
+  struct Case {
+    int alpha;  // -1: tintedCopy
+    int expected[3];
+  };
+  // tintedCopy weighs g + 1: 200 x 1 >> 8, 200 x 129 >> 8, 200 x 256 >> 8. With alpha the 8-bit weight is
+  // trunc((g + 1) x alpha / 255): 0, 64, 128 at alpha 128 and 0, 32, 64 at alpha 64.
+  for (const Case& k : {Case{-1, {0, 100, 200}}, Case{255, {0, 100, 200}}, Case{128, {0, 50, 100}},
+                        Case{64, {0, 25, 50}}, Case{0, {0, 0, 0}}}) {
+    DibSurface s = greySurface(3, 1, 0);
+    if (k.alpha < 0)
+      threeGreys().tintedCopy(&s, 0, 0, 3, 1, 0, 0, tint);
+    else
+      threeGreys().tintedCopyAlpha(&s, 0, 0, 3, 1, 0, 0, tint, k.alpha);
+    for (int x = 0; x < 3; ++x) EXPECT_EQ(s.at(x, 0)[0], k.expected[x]) << k.alpha << " " << x;
+  }
+  // A 24-bit mask reads its middle byte and weighs trunc(g x alpha / 255): 255 of 256 at full alpha.
   test::BmpSpec spec;
-  spec.width = 1;
-  spec.height = 1;
+  spec.bits = 24;
+  spec.colours = 0;
   spec.pixel = [](int, int, int ch) { return uint8_t(ch == 1 ? 255 : 0); };
-  const SkinBitmap mask24 = loaded(spec);
-  s = greySurface(1, 1, 0);
-  mask24.tintedCopyAlpha(&s, 0, 0, 1, 1, 0, 0, tint, 255);
-  EXPECT_EQ(s.at(0, 0)[0], 199);
+  DibSurface s = greySurface(2, 2, 0);
+  loaded(spec).tintedCopyAlpha(&s, 0, 0, 2, 2, 0, 0, tint, 255);
+  EXPECT_EQ(s.at(1, 1)[0], 199);
 }
 
 TEST(CopyTest, PaletteAndMaskedCopiesClippedToTheSurface) {
-  // 8-bit picture: palette entry i is B = i, G = 2i, R = 3i; pixel (x, y) has index 10 + x + 4y.
-  test::BmpSpec spec;
-  spec.width = 4;
-  spec.height = 2;
-  spec.bits = 8;
-  spec.colours = 256;
+  // Palette entry i is B = i, G = 2i, R = 3i; pixel (x, y) has index 10 + x + 4y.
+  test::BmpSpec spec = test::greyBitmap(4, 2, [](int x, int y) { return uint8_t(10 + x + 4 * y); });
   spec.palette = [](int i, int ch) { return static_cast<uint8_t>(i * (ch + 1)); };
-  spec.pixel = [](int x, int y, int) { return static_cast<uint8_t>(10 + x + 4 * y); };
-  const SkinBitmap picture = loaded(spec);
   DibSurface s = greySurface(3, 3, 7);
-  picture.copy(&s, -1, 1, 4, 2, 0, 0);  // the left source column falls off
-  EXPECT_EQ(rgb(s, 0, 1), (33u << 16) | (22u << 8) | 11u);
-  EXPECT_EQ(rgb(s, 2, 1), (39u << 16) | (26u << 8) | 13u);
-  EXPECT_EQ(rgb(s, 0, 2), (45u << 16) | (30u << 8) | 15u);
-  EXPECT_EQ(rgb(s, 0, 0), 0x070707u);
+  loaded(spec).copy(&s, -1, 1, 4, 2, 0, 0);  // the left source column falls off
+  EXPECT_TRUE(s.at(0, 1)[0] == 11 && s.at(0, 1)[1] == 22 && s.at(0, 1)[2] == 33);
+  EXPECT_TRUE(s.at(2, 2)[0] == 17 && s.at(2, 2)[2] == 51);
+  EXPECT_EQ(s.at(0, 0)[0], 7);
 
-  // Mask grey 0 keeps the destination, 255 takes the source, 128 gives trunc(s x 128/255 + d x 127/255).
-  const SkinBitmap grey200 = loaded(greyBitmap(3, 1, [](int, int) { return uint8_t(200); }));
-  const SkinBitmap mask = loaded(greyBitmap(3, 1, [](int x, int) { return uint8_t(x == 0 ? 0 : x == 1 ? 128 : 255); }));
+  // Grey 0 keeps the destination, 255 takes the source, 128 gives trunc(200 x 128/255 + 100 x 127/255).
+  const SkinBitmap grey200 = loaded(test::greyBitmap(3, 1, [](int, int) { return uint8_t(200); }));
   s = greySurface(3, 1, 100);
-  grey200.maskedCopy(&s, 0, 0, 3, 1, 0, 0, &mask);
-  EXPECT_EQ(s.at(0, 0)[1], 100);
-  EXPECT_EQ(s.at(1, 0)[1], 150);
-  EXPECT_EQ(s.at(2, 0)[1], 200);
+  grey200.maskedCopy(&s, 0, 0, 3, 1, 0, 0, &threeGreys());
+  EXPECT_TRUE(s.at(0, 0)[1] == 100 && s.at(1, 0)[1] == 150 && s.at(2, 0)[1] == 200);
 
   // Missing surfaces, masks and bitmaps draw nothing.
   SkinBitmap empty(nullptr);

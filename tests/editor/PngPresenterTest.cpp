@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 #include <png.h>
 
-#include <cstdio>
 #include <cstring>
 #include <filesystem>
 #include <vector>
@@ -12,15 +11,17 @@
 namespace ulvetta {
 namespace {
 
+namespace fs = std::filesystem;
+
 TEST(PngPresenterTest, WritesTheRectangleAndNothingOnFailure) {
   DibSurface surface;
   ASSERT_TRUE(surface.create(0, 0, 7, 5));
   for (int y = 0; y < 5; ++y)
     for (int x = 0; x < 7; ++x) {
-      uint8_t* p = surface.at(x, y);
-      p[0] = uint8_t(x * 30);  // blue
-      p[1] = uint8_t(y * 40);  // green
-      p[2] = 99;               // red
+      uint8_t* p = surface.at(x, y);  // B, G, R
+      p[0] = uint8_t(x * 30);
+      p[1] = uint8_t(y * 40);
+      p[2] = 99;
     }
   const std::string path = testing::TempDir() + "editor_present.png";
   PngPresenter presenter(path);
@@ -33,30 +34,25 @@ TEST(PngPresenterTest, WritesTheRectangleAndNothingOnFailure) {
   image.format = PNG_FORMAT_RGB;
   std::vector<uint8_t> rgb(PNG_IMAGE_SIZE(image));
   ASSERT_TRUE(png_image_finish_read(&image, nullptr, rgb.data(), 0, nullptr));
-  ASSERT_EQ(image.width, 5u);
-  ASSERT_EQ(image.height, 3u);
+  ASSERT_TRUE(image.width == 5 && image.height == 3);
   for (int y = 0; y < 3; ++y)
     for (int x = 0; x < 5; ++x) {
       const uint8_t* p = &rgb[(y * 5 + x) * 3];
-      EXPECT_EQ(p[0], 99);
-      EXPECT_EQ(p[1], (y + 1) * 40);
-      EXPECT_EQ(p[2], (x + 2) * 30);
+      EXPECT_TRUE(p[0] == 99 && p[1] == (y + 1) * 40 && p[2] == (x + 2) * 30) << x << "," << y;
     }
-  std::remove(path.c_str());
+  fs::remove(path);
 
+  // A directory in the way, a missing folder and an empty rectangle: false, a reason, and no file left.
   const std::string dir = testing::TempDir() + "editor_present_dir";
-  std::filesystem::create_directories(dir);
-  PngPresenter blocked(dir);  // a directory cannot be replaced by a file
+  fs::create_directories(dir);
+  PngPresenter blocked(dir);
   EXPECT_FALSE(blocked.present(surface, 0, 0, 7, 5));
   EXPECT_FALSE(blocked.error().empty());
-  EXPECT_TRUE(std::filesystem::is_directory(dir));
-  for (const auto& entry : std::filesystem::directory_iterator(testing::TempDir()))
-    EXPECT_EQ(entry.path().filename().string().rfind("editor_present_dir.", 0), std::string::npos);
-  PngPresenter nowhere(testing::TempDir() + "no/such/dir/x.png");
-  EXPECT_FALSE(nowhere.present(surface, 0, 0, 7, 5));
-  EXPECT_FALSE(PngPresenter(path).present(surface, 7, 0, 3, 3));
-  EXPECT_FALSE(std::filesystem::exists(path));
-  std::filesystem::remove(dir);
+  for (const auto& entry : fs::directory_iterator(testing::TempDir()))
+    EXPECT_NE(entry.path().filename().string().rfind("editor_present_dir.", 0), 0u);
+  EXPECT_FALSE(PngPresenter(testing::TempDir() + "no/such/x.png").present(surface, 0, 0, 7, 5));
+  EXPECT_FALSE(PngPresenter(path).present(surface, 7, 0, 3, 3) || fs::exists(path));
+  fs::remove(dir);
 }
 
 }  // namespace
