@@ -40,8 +40,7 @@ const Picture kPictures[] = {
 
 std::unique_ptr<SkinBitmap> synthetic(int w, int h, int seed) {
   auto bitmap = std::make_unique<SkinBitmap>(nullptr);
-  const auto dib = test::makeDib(test::greyBitmap(w, h, [seed](int x, int y) { return uint8_t(x * 7 + y * 13 + seed); }));
-  bitmap->loadDib(dib.data(), dib.size());
+  test::load(*bitmap, test::greyBitmap(w, h, [seed](int x, int y) { return uint8_t(x * 7 + y * 13 + seed); }));
   return bitmap;
 }
 
@@ -54,9 +53,7 @@ void BM_EditorFullRepaint(benchmark::State& state) {
     masks.push_back(synthetic(p.w, p.h, 99));
   }
   BitmapFont font(nullptr);
-  const auto strip = test::makeDib(
-      test::greyBitmap(kSmallFontWidth, kSmallFontHeight, [](int x, int y) { return uint8_t((x ^ y) * 37); }));
-  font.strip().loadDib(strip.data(), strip.size());
+  test::load(font.strip(), test::greyBitmap(kSmallFontWidth, kSmallFontHeight, [](int x, int y) { return uint8_t((x ^ y) * 37); }));
   font.setGlyphs(kFontCharacterSet, kSmallFontWidths.data());
   char texts[25][16];
   for (int i = 0; i < 25; ++i) std::snprintf(texts[i], sizeof texts[i], "%+.1f dB", -60.0 + 2.5 * i);

@@ -1,13 +1,16 @@
 #pragma once
-// Hand-made bitmaps for the editor tests: the bytes of a DIB (header, palette, rows) or of a whole BMP file.
+// Hand-made bitmaps for the editor's tests and benchmark: the bytes of a DIB (header, palette, rows), of a
+// whole BMP file, or a SkinBitmap loaded from them.
 #include <cstdint>
 #include <functional>
 #include <vector>
 
+#include "editor/SkinBitmap.h"
+
 namespace ulvetta::test {
 
 struct BmpSpec {
-  int headerSize = 40;  // 12 (core) or 40 (info)
+  int headerSize = 40;        // 12 (core) or 40 (info)
   int width = 2, height = 2;  // negative height: top-down rows
   int bits = 8;
   uint32_t colours = 256;  // palette entries written (info header: also the stored count)
@@ -23,19 +26,18 @@ inline void put(std::vector<uint8_t>& out, uint32_t v, int bytes) {
 
 inline std::vector<uint8_t> makeDib(const BmpSpec& s) {
   std::vector<uint8_t> out;
-  const int field = s.headerSize == 12 ? 2 : 4;
-  put(out, static_cast<uint32_t>(s.headerSize), 4);
-  put(out, static_cast<uint32_t>(s.width), field);
-  put(out, static_cast<uint32_t>(s.height), field);
+  const int field = s.headerSize == 12 ? 2 : 4, entry = s.headerSize == 12 ? 3 : 4;
+  put(out, s.headerSize, 4);
+  put(out, s.width, field);
+  put(out, s.height, field);
   put(out, 1, 2);
-  put(out, static_cast<uint32_t>(s.bits), 2);
+  put(out, s.bits, 2);
   if (s.headerSize == 40) {
     put(out, 0, 16);  // no compression, image size, resolution
-    put(out, s.colours, 4);
-    put(out, 0, 4);
+    put(out, s.colours, 8);
   }
   for (uint32_t i = 0; i < s.colours; ++i)
-    for (int c = 0; c < (s.headerSize == 12 ? 3 : 4); ++c) out.push_back(c < 3 ? s.palette(int(i), c) : 0);
+    for (int c = 0; c < entry; ++c) out.push_back(c < 3 ? s.palette(int(i), c) : 0);
   const int rows = s.height < 0 ? -s.height : s.height, bytes = s.bits >= 8 ? s.bits / 8 : 1;
   const size_t stride = (size_t(s.width) * s.bits + 31) / 32 * 4;
   for (int r = 0; r < rows; ++r) {
@@ -64,6 +66,12 @@ inline BmpSpec greyBitmap(int width, int height, std::function<uint8_t(int, int)
   s.height = height;
   s.pixel = [level](int x, int y, int) { return level(x, y); };
   return s;
+}
+
+// Loads spec's DIB into bitmap; false when the loader refuses it.
+inline bool load(SkinBitmap& bitmap, const BmpSpec& spec) {
+  const std::vector<uint8_t> dib = makeDib(spec);
+  return bitmap.loadDib(dib.data(), dib.size());
 }
 
 }  // namespace ulvetta::test

@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include "editor/BmpBuilder.h"
-#include "editor/SkinBitmap.h"
 #include "editor/SkinDraw.h"
 
 namespace ulvetta {
@@ -17,32 +16,23 @@ DibSurface greySurface(int w, int h, uint8_t level) {
 
 SkinBitmap loaded(const test::BmpSpec& spec) {
   SkinBitmap b(nullptr);
-  const auto dib = test::makeDib(spec);
-  EXPECT_TRUE(b.loadDib(dib.data(), dib.size()));
+  EXPECT_TRUE(test::load(b, spec));
   return b;
 }
 
 // Grey levels 0, 128 and 255 across three pixels.
-const SkinBitmap& threeGreys() {
-  static const SkinBitmap bitmap = loaded(test::greyBitmap(3, 1, [](int x, int) { return uint8_t(x * 128 - x / 2); }));
-  return bitmap;
-}
+const test::BmpSpec kThreeGreys = test::greyBitmap(3, 1, [](int x, int) { return uint8_t(x * 128 - x / 2); });
 
 TEST(FillTest, AlphaZeroHalfAndFullClippedToTheSurface) {
   DibSurface s = greySurface(4, 3, 200);
   fillRect(&s, 0, 0, 4, 3, {1, 2, 3, 0});
-  EXPECT_EQ(s.at(1, 1)[0], 200);
   // Weight 129/256 of R 100, G 0, B 200 over 200: (200 x 127 + c x 129) >> 8.
   fillRect(&s, 1, 1, 1, 1, {100, 0, 200, 128});
-  EXPECT_EQ(s.at(1, 1)[2], 149);
-  EXPECT_EQ(s.at(1, 1)[1], 99);
-  EXPECT_EQ(s.at(1, 1)[0], 200);
+  EXPECT_TRUE(s.at(1, 1)[2] == 149 && s.at(1, 1)[1] == 99 && s.at(1, 1)[0] == 200 && s.at(0, 0)[0] == 200);
   fillRect(&s, -5, 2, 100, 100, {10, 20, 30, 255});
-  EXPECT_EQ(s.at(0, 2)[2], 10);
-  EXPECT_EQ(s.at(3, 2)[0], 30);
-  EXPECT_EQ(s.at(3, 1)[0], 200);
+  EXPECT_TRUE(s.at(0, 2)[2] == 10 && s.at(3, 2)[0] == 30 && s.at(3, 1)[0] == 200);
   EXPECT_FALSE(s.create(0, 0, 0, 10) || s.create(0, 0, 10, 10, 24));
-  fillRect(&s, 0, 0, 1, 1, {0, 0, 0, 255});
+  fillRect(&s, 0, 0, 1, 1, {0, 0, 0, 255});  // an empty surface draws nothing
 }
 
 TEST(LineTest, HorizontalVerticalAndDiagonalPixelPairs) {
@@ -64,26 +54,23 @@ TEST(LineTest, HorizontalVerticalAndDiagonalPixelPairs) {
   // Equal extents step along y; lines running off the surface draw their inside part only.
   s = greySurface(6, 6, 100);
   drawLine(&s, -3, -3, 8, 8, c);
-  for (int k = 0; k < 6; ++k) EXPECT_EQ(s.at(k, k)[0], 201) << k;
   drawLine(&s, -1000000000, 3, 2000000000, 3, c);
-  EXPECT_EQ(s.at(5, 3)[0], 201);
+  for (int k = 0; k < 6; ++k) EXPECT_TRUE(s.at(k, k)[0] == 201 && s.at(k, 3)[0] == 201) << k;
 }
 
 TEST(TintTest, GreyLevelsWeightTheColourAtSeveralAlphas) {
   const SkinColour tint{200, 200, 200, 255};
-  struct Case {
-    int alpha;  // -1: tintedCopy
-    int expected[3];
-  };
+  const SkinBitmap greys = loaded(kThreeGreys);
   // tintedCopy weighs g + 1: 200 x 1 >> 8, 200 x 129 >> 8, 200 x 256 >> 8. With alpha the 8-bit weight is
   // trunc((g + 1) x alpha / 255): 0, 64, 128 at alpha 128 and 0, 32, 64 at alpha 64.
-  for (const Case& k : {Case{-1, {0, 100, 200}}, Case{255, {0, 100, 200}}, Case{128, {0, 50, 100}},
-                        Case{64, {0, 25, 50}}, Case{0, {0, 0, 0}}}) {
+  const struct { int alpha, expected[3]; } cases[] = {
+      {-1, {0, 100, 200}}, {255, {0, 100, 200}}, {128, {0, 50, 100}}, {64, {0, 25, 50}}, {0, {0, 0, 0}}};
+  for (const auto& k : cases) {
     DibSurface s = greySurface(3, 1, 0);
     if (k.alpha < 0)
-      threeGreys().tintedCopy(&s, 0, 0, 3, 1, 0, 0, tint);
+      greys.tintedCopy(&s, 0, 0, 3, 1, 0, 0, tint);
     else
-      threeGreys().tintedCopyAlpha(&s, 0, 0, 3, 1, 0, 0, tint, k.alpha);
+      greys.tintedCopyAlpha(&s, 0, 0, 3, 1, 0, 0, tint, k.alpha);
     for (int x = 0; x < 3; ++x) EXPECT_EQ(s.at(x, 0)[0], k.expected[x]) << k.alpha << " " << x;
   }
   // A 24-bit mask reads its middle byte and weighs trunc(g x alpha / 255): 255 of 256 at full alpha.
@@ -103,21 +90,19 @@ TEST(CopyTest, PaletteAndMaskedCopiesClippedToTheSurface) {
   DibSurface s = greySurface(3, 3, 7);
   loaded(spec).copy(&s, -1, 1, 4, 2, 0, 0);  // the left source column falls off
   EXPECT_TRUE(s.at(0, 1)[0] == 11 && s.at(0, 1)[1] == 22 && s.at(0, 1)[2] == 33);
-  EXPECT_TRUE(s.at(2, 2)[0] == 17 && s.at(2, 2)[2] == 51);
-  EXPECT_EQ(s.at(0, 0)[0], 7);
+  EXPECT_TRUE(s.at(2, 2)[0] == 17 && s.at(2, 2)[2] == 51 && s.at(0, 0)[0] == 7);
 
   // Grey 0 keeps the destination, 255 takes the source, 128 gives trunc(200 x 128/255 + 100 x 127/255).
   const SkinBitmap grey200 = loaded(test::greyBitmap(3, 1, [](int, int) { return uint8_t(200); }));
-  s = greySurface(3, 1, 100);
-  grey200.maskedCopy(&s, 0, 0, 3, 1, 0, 0, &threeGreys());
-  EXPECT_TRUE(s.at(0, 0)[1] == 100 && s.at(1, 0)[1] == 150 && s.at(2, 0)[1] == 200);
-
-  // Missing surfaces, masks and bitmaps draw nothing.
+  const SkinBitmap mask = loaded(kThreeGreys);
   SkinBitmap empty(nullptr);
+  s = greySurface(3, 1, 100);
+  grey200.maskedCopy(&s, 0, 0, 3, 1, 0, 0, &mask);
+  EXPECT_TRUE(s.at(0, 0)[1] == 100 && s.at(1, 0)[1] == 150 && s.at(2, 0)[1] == 200);
+  // Missing masks and bitmaps draw nothing.
   empty.copy(&s, 0, 0, 3, 1, 0, 0);
   grey200.maskedCopy(&s, 0, 0, 3, 1, 0, 0, &empty);
   grey200.maskedCopy(&s, 0, 0, 3, 1, 0, 0, nullptr);
-  grey200.copy(nullptr, 0, 0, 3, 1, 0, 0);
   EXPECT_EQ(s.at(0, 0)[1], 100);
 }
 

@@ -16,8 +16,7 @@ namespace {
 class FontTest : public testing::Test {
  protected:
   void SetUp() override {
-    const auto dib = test::makeDib(test::greyBitmap(5, 2, [](int x, int) { return uint8_t(x < 2 ? 255 : 127); }));
-    ASSERT_TRUE(font.strip().loadDib(dib.data(), dib.size()));
+    ASSERT_TRUE(test::load(font.strip(), test::greyBitmap(5, 2, [](int x, int) { return uint8_t(x < 2 ? 255 : 127); })));
     const int widths[] = {2, 3};
     font.setGlyphs("AB", widths);
     ASSERT_TRUE(surface.create(0, 0, 12, 8));
@@ -72,8 +71,7 @@ TEST(EditorFontsTest, WidthTablesFillTheirStrips) {
   EXPECT_EQ(std::accumulate(kLargeFontWidths.begin(), kLargeFontWidths.end(), 0), kLargeFontWidth);
   BitmapFont small(nullptr);
   small.setGlyphs(kFontCharacterSet, kSmallFontWidths.data());
-  EXPECT_EQ(small.glyphOffset('z') + small.glyphWidth('z'), kSmallFontWidth);
-  EXPECT_EQ(small.textWidth("W1"), 9 + 4);
+  EXPECT_EQ(small.textWidth("W1+,z"), 9 + 4 + 6 + 2 + 4);
 }
 
 }  // namespace

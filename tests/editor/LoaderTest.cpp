@@ -72,10 +72,7 @@ TEST(LoaderTest, RefusedFilesLeaveTheBitmapEmpty) {
     for (int i = 0; i < bytes; ++i) f.at(at + i) = static_cast<uint8_t>(value >> (8 * i));
     return f;
   };
-  auto cut = [](std::vector<uint8_t> f, size_t size) {
-    f.resize(size);
-    return f;
-  };
+  auto cut = [](std::vector<uint8_t> f, size_t size) { return std::vector<uint8_t>(f.begin(), f.begin() + size); };
   test::BmpSpec eight = gradient(40, 750, 167, 8);
   eight.colours = 256;
   const auto paletted = test::makeFile(eight);
