@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <vector>
 
+#include "editor/SkinDraw.h"
 #include "editor/headless/PngPresenter.h"
 
 namespace ulvetta {
@@ -17,12 +18,7 @@ TEST(PngPresenterTest, WritesTheRectangleAndNothingOnFailure) {
   DibSurface surface;
   ASSERT_TRUE(surface.create(0, 0, 7, 5));
   for (int y = 0; y < 5; ++y)
-    for (int x = 0; x < 7; ++x) {
-      uint8_t* p = surface.at(x, y);  // B, G, R
-      p[0] = uint8_t(x * 30);
-      p[1] = uint8_t(y * 40);
-      p[2] = 99;
-    }
+    for (int x = 0; x < 7; ++x) fillRect(&surface, x, y, 1, 1, {99, uint8_t(y * 40), uint8_t(x * 30), 255});
   const std::string path = testing::TempDir() + "editor_present.png";
   PngPresenter presenter(path);
   ASSERT_TRUE(presenter.present(surface, 2, 1, 10, 3)) << presenter.error();  // clipped to 5 x 3

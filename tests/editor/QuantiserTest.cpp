@@ -6,6 +6,7 @@
 #include <tuple>
 
 #include "editor/OctreeQuantiser.h"
+#include "editor/SkinDraw.h"
 
 namespace ulvetta {
 namespace {
@@ -19,15 +20,10 @@ std::set<std::tuple<int, int, int>> asSet(const std::vector<SkinColour>& palette
 TEST(QuantiserTest, KeepsFewColoursExactlyAndReducesMany) {
   std::mt19937 random(11);
   DibSurface surface;
-  ASSERT_TRUE(surface.create(0, 0, 100, 50));
+  ASSERT_TRUE(surface.create(0, 0, 236, 3));
   std::vector<SkinColour> used(236);
   for (SkinColour& c : used) c = {uint8_t(random()), uint8_t(random()), uint8_t(random()), 255};
-  for (int p = 0; p < 100 * 50; ++p) {
-    const SkinColour& c = used[(p * 7) % used.size()];
-    surface.pixels()[p * 4] = c.b;
-    surface.pixels()[p * 4 + 1] = c.g;
-    surface.pixels()[p * 4 + 2] = c.r;
-  }
+  for (int p = 0; p < 236 * 3; ++p) fillRect(&surface, p % 236, p / 236, 1, 1, used[(p * 7) % 236]);
   // The surface computes its palette once and keeps it while its contents change.
   EXPECT_EQ(asSet(surface.displayPalette()), asSet(used));
   surface.pixels()[0] ^= 0xFF;
