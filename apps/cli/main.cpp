@@ -15,6 +15,7 @@
 #include "IrCommand.h"
 #include "ParamsReport.h"
 #include "Render.h"
+#include "SkinSheet.h"
 #include "filter/ReverbCore.h"
 #include "presets/PresetFile.h"
 
@@ -115,6 +116,11 @@ int run(int argc, char** argv) {
     ir->add_option("OUT", irOut, "Write the prepared response of --algorithm 3, 4 or 5 here as a float WAV");
     ir->add_option("--rate", irRate, "Stream rate in Hz for the export (default 44100)")->type_name("HZ");
 
+    // skin
+    auto* skin = app.add_subcommand("skin", "Draw a review sheet of the editor's bitmaps and fonts (OUT.png)");
+    std::string skinOut;
+    skin->add_option("OUT", skinOut, "The PNG file to write")->required();
+
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& e) {
@@ -161,6 +167,11 @@ int run(int argc, char** argv) {
         ReverbCore core;
         irSetup.apply(core);
         exportResponse(core, static_cast<int>(rate), irOut);
+        return kExitOk;
+    }
+
+    if (skin->parsed()) {
+        writeSkinSheet(skinOut);
         return kExitOk;
     }
 

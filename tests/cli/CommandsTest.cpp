@@ -110,5 +110,16 @@ TEST_F(CliTest, IrExportEqualsTheRenderedImpulseResponse) {
     }
 }
 
+TEST_F(CliTest, SkinSheetIsAWholePngOrNothing) {
+    ASSERT_EQ(run({"skin", "sheet.png"}).status, 0);
+    const std::string png = slurp(dir_ / "sheet.png");
+    ASSERT_GT(png.size(), 24u);
+    EXPECT_EQ(png.substr(0, 8), "\x89PNG\r\n\x1a\n");
+    const auto byte = [&](size_t i) { return static_cast<unsigned char>(png[i]); };
+    EXPECT_EQ(byte(16) << 24 | byte(17) << 16 | byte(18) << 8 | byte(19), 1024);  // IHDR width
+    expectOneSentence(run({"skin", "missing/sheet.png"}), 1);
+    EXPECT_EQ(listing(), std::vector<std::string>{"sheet.png"});
+}
+
 }  // namespace
 }  // namespace ulvetta::testing
