@@ -5,6 +5,14 @@
 #include <cstdlib>
 
 #include "editor/SkinBitmap.h"
+#include "resources/BitmapResources.h"
+
+// The target reads files only: it builds the editor's sources without the module's embedded bitmaps, so the
+// default resource lookup finds nothing.
+const uint8_t* ulvetta::BitmapResource(int, size_t* size) {
+  if (size != nullptr) *size = 0;
+  return nullptr;
+}
 
 namespace {
 
