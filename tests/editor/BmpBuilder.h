@@ -9,7 +9,7 @@
 
 namespace ulvetta::test {
 
-struct BmpSpec {
+struct BmpLayout {
   int headerSize = 40;        // 12 (core) or 40 (info)
   int width = 2, height = 2;  // negative height: top-down rows
   int bits = 8;
@@ -24,7 +24,7 @@ inline void put(std::vector<uint8_t>& out, uint32_t v, int bytes) {
   for (int i = 0; i < bytes; ++i) out.push_back(i < 4 ? static_cast<uint8_t>(v >> (8 * i)) : 0);
 }
 
-inline std::vector<uint8_t> makeDib(const BmpSpec& s) {
+inline std::vector<uint8_t> makeDib(const BmpLayout& s) {
   std::vector<uint8_t> out;
   const int field = s.headerSize == 12 ? 2 : 4, entry = s.headerSize == 12 ? 3 : 4;
   put(out, s.headerSize, 4);
@@ -50,7 +50,7 @@ inline std::vector<uint8_t> makeDib(const BmpSpec& s) {
 }
 
 // A BMP file: "BM", its size, and the rows' offset after the header and palette.
-inline std::vector<uint8_t> makeFile(const BmpSpec& s) {
+inline std::vector<uint8_t> makeFile(const BmpLayout& s) {
   const std::vector<uint8_t> dib = makeDib(s);
   std::vector<uint8_t> out{'B', 'M'};
   put(out, static_cast<uint32_t>(14 + dib.size()), 8);
@@ -60,17 +60,17 @@ inline std::vector<uint8_t> makeFile(const BmpSpec& s) {
 }
 
 // An 8-bit grey picture: palette entry i is grey i and pixel (x, y) has index level(x, y).
-inline BmpSpec greyBitmap(int width, int height, std::function<uint8_t(int, int)> level) {
-  BmpSpec s;
+inline BmpLayout greyBitmap(int width, int height, std::function<uint8_t(int, int)> level) {
+  BmpLayout s;
   s.width = width;
   s.height = height;
   s.pixel = [level](int x, int y, int) { return level(x, y); };
   return s;
 }
 
-// Loads spec's DIB into bitmap; false when the loader refuses it.
-inline bool load(SkinBitmap& bitmap, const BmpSpec& spec) {
-  const std::vector<uint8_t> dib = makeDib(spec);
+// Loads layout's DIB into bitmap; false when the loader refuses it.
+inline bool load(SkinBitmap& bitmap, const BmpLayout& layout) {
+  const std::vector<uint8_t> dib = makeDib(layout);
   return bitmap.loadDib(dib.data(), dib.size());
 }
 

@@ -14,14 +14,14 @@ DibSurface greySurface(int w, int h, uint8_t level) {
   return s;
 }
 
-SkinBitmap loaded(const test::BmpSpec& spec) {
+SkinBitmap loaded(const test::BmpLayout& layout) {
   SkinBitmap b(nullptr);
-  EXPECT_TRUE(test::load(b, spec));
+  EXPECT_TRUE(test::load(b, layout));
   return b;
 }
 
 // Grey levels 0, 128 and 255 across three pixels.
-const test::BmpSpec kThreeGreys = test::greyBitmap(3, 1, [](int x, int) { return uint8_t(x * 128 - x / 2); });
+const test::BmpLayout kThreeGreys = test::greyBitmap(3, 1, [](int x, int) { return uint8_t(x * 128 - x / 2); });
 
 TEST(FillTest, AlphaZeroHalfAndFullClippedToTheSurface) {
   DibSurface s = greySurface(4, 3, 200);
@@ -74,21 +74,21 @@ TEST(TintTest, GreyLevelsWeightTheColourAtSeveralAlphas) {
     for (int x = 0; x < 3; ++x) EXPECT_EQ(s.at(x, 0)[0], k.expected[x]) << k.alpha << " " << x;
   }
   // A 24-bit mask reads its middle byte and weighs trunc(g x alpha / 255): 255 of 256 at full alpha.
-  test::BmpSpec spec;
-  spec.bits = 24;
-  spec.colours = 0;
-  spec.pixel = [](int, int, int ch) { return uint8_t(ch == 1 ? 255 : 0); };
+  test::BmpLayout layout;
+  layout.bits = 24;
+  layout.colours = 0;
+  layout.pixel = [](int, int, int ch) { return uint8_t(ch == 1 ? 255 : 0); };
   DibSurface s = greySurface(2, 2, 0);
-  loaded(spec).tintedCopyAlpha(&s, 0, 0, 2, 2, 0, 0, tint, 255);
+  loaded(layout).tintedCopyAlpha(&s, 0, 0, 2, 2, 0, 0, tint, 255);
   EXPECT_EQ(s.at(1, 1)[0], 199);
 }
 
 TEST(CopyTest, PaletteAndMaskedCopiesClippedToTheSurface) {
   // Palette entry i is B = i, G = 2i, R = 3i; pixel (x, y) has index 10 + x + 4y.
-  test::BmpSpec spec = test::greyBitmap(4, 2, [](int x, int y) { return uint8_t(10 + x + 4 * y); });
-  spec.palette = [](int i, int ch) { return static_cast<uint8_t>(i * (ch + 1)); };
+  test::BmpLayout layout = test::greyBitmap(4, 2, [](int x, int y) { return uint8_t(10 + x + 4 * y); });
+  layout.palette = [](int i, int ch) { return static_cast<uint8_t>(i * (ch + 1)); };
   DibSurface s = greySurface(3, 3, 7);
-  loaded(spec).copy(&s, -1, 1, 4, 2, 0, 0);  // the left source column falls off
+  loaded(layout).copy(&s, -1, 1, 4, 2, 0, 0);  // the left source column falls off
   EXPECT_TRUE(s.at(0, 1)[0] == 11 && s.at(0, 1)[1] == 22 && s.at(0, 1)[2] == 33);
   EXPECT_TRUE(s.at(2, 2)[0] == 17 && s.at(2, 2)[2] == 51 && s.at(0, 0)[0] == 7);
 

@@ -12,8 +12,8 @@ namespace ulvetta {
 namespace {
 
 // A 24-bit picture whose pixel (x, y) is B = x, G = y, R = 7.
-test::BmpSpec gradient(int headerSize, int width, int height, int bits = 24) {
-  test::BmpSpec s;
+test::BmpLayout gradient(int headerSize, int width, int height, int bits = 24) {
+  test::BmpLayout s;
   s.headerSize = headerSize;
   s.width = width;
   s.height = height;
@@ -46,7 +46,7 @@ TEST(LoaderTest, HeaderKindsRowOrdersResourcesAndFiles) {
     expectGradient(b, 5, 3);
   }
   // 8-bit through a core header's 3-byte palette entries: index 9 is B 9, G 18, R 27.
-  test::BmpSpec core = test::greyBitmap(3, 2, [](int x, int y) { return uint8_t(x + 3 * y + 4); });
+  test::BmpLayout core = test::greyBitmap(3, 2, [](int x, int y) { return uint8_t(x + 3 * y + 4); });
   core.headerSize = 12;
   core.palette = [](int i, int ch) { return static_cast<uint8_t>(i * (ch + 1)); };
   gResource = test::makeDib(core);
@@ -73,7 +73,7 @@ TEST(LoaderTest, RefusedFilesLeaveTheBitmapEmpty) {
     return f;
   };
   auto cut = [](std::vector<uint8_t> f, size_t size) { return std::vector<uint8_t>(f.begin(), f.begin() + size); };
-  test::BmpSpec eight = gradient(40, 750, 167, 8);
+  test::BmpLayout eight = gradient(40, 750, 167, 8);
   eight.colours = 256;
   const auto paletted = test::makeFile(eight);
   eight.colours = 300;
