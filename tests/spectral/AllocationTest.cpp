@@ -1,58 +1,9 @@
 // The transforms, the spectrum product and the FIR filter allocate nothing once their tables and buffers
-// exist. Every global operator new of this test binary is replaced by one that counts while asked to.
-#include <atomic>
-#include <cstdlib>
-#include <new>
+// exist, counted through the test binary's replaced global operator new.
 #include <vector>
 
 #include "SpectralTestSupport.h"
-
-#if !defined(_WIN32)
-
-namespace {
-
-std::atomic<bool> gCounting{false};
-std::atomic<int> gAllocations{0};
-
-void* allocate(std::size_t n, std::size_t align) noexcept {
-    if (gCounting.load()) gAllocations.fetch_add(1);
-    void* p = nullptr;
-    if (align <= alignof(std::max_align_t)) return std::malloc(n ? n : 1);
-    return posix_memalign(&p, align, n ? n : 1) == 0 ? p : nullptr;
-}
-
-void* allocateOrThrow(std::size_t n, std::size_t align) {
-    if (void* p = allocate(n, align)) return p;
-    throw std::bad_alloc();
-}
-
-}  // namespace
-
-// Every form, so that no allocation bypasses the count (a sanitizer supplies its own defaults).
-void* operator new(std::size_t n) { return allocateOrThrow(n, 0); }
-void* operator new[](std::size_t n) { return allocateOrThrow(n, 0); }
-void* operator new(std::size_t n, const std::nothrow_t&) noexcept { return allocate(n, 0); }
-void* operator new[](std::size_t n, const std::nothrow_t&) noexcept { return allocate(n, 0); }
-void* operator new(std::size_t n, std::align_val_t a) { return allocateOrThrow(n, std::size_t(a)); }
-void* operator new[](std::size_t n, std::align_val_t a) { return allocateOrThrow(n, std::size_t(a)); }
-void* operator new(std::size_t n, std::align_val_t a, const std::nothrow_t&) noexcept {
-    return allocate(n, std::size_t(a));
-}
-void* operator new[](std::size_t n, std::align_val_t a, const std::nothrow_t&) noexcept {
-    return allocate(n, std::size_t(a));
-}
-void operator delete(void* p) noexcept { std::free(p); }
-void operator delete[](void* p) noexcept { std::free(p); }
-void operator delete(void* p, std::size_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::size_t) noexcept { std::free(p); }
-void operator delete(void* p, const std::nothrow_t&) noexcept { std::free(p); }
-void operator delete[](void* p, const std::nothrow_t&) noexcept { std::free(p); }
-void operator delete(void* p, std::align_val_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::align_val_t) noexcept { std::free(p); }
-void operator delete(void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
-void operator delete[](void* p, std::size_t, std::align_val_t) noexcept { std::free(p); }
-void operator delete(void* p, std::align_val_t, const std::nothrow_t&) noexcept { std::free(p); }
-void operator delete[](void* p, std::align_val_t, const std::nothrow_t&) noexcept { std::free(p); }
+#include "support/AllocationCounter.h"
 
 using namespace ulvetta;
 using namespace spectral_test;
@@ -61,12 +12,10 @@ namespace {
 
 // Counts the allocations made by body.
 template <class F>
-int allocationsIn(F body) {
-    gAllocations.store(0);
-    gCounting.store(true);
+long allocationsIn(F body) {
+    AllocationCounter counter;
     body();
-    gCounting.store(false);
-    return gAllocations.load();
+    return counter.count();
 }
 
 }  // namespace
@@ -108,5 +57,3 @@ TEST(SpectralAllocation, NothingIsAllocatedOnceTablesAndBuffersExist) {
     nspFirFree(&fir);
     EXPECT_TRUE(std::isfinite(sink));
 }
-
-#endif
