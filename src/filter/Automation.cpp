@@ -17,21 +17,18 @@ bool Intersects(const EnvelopeSegment& s, int64_t s0, int64_t s1) {
     return s0In || s1In || inside;
 }
 
-// Automation types 2 (switch) and 3 (list) are set by integer value.
-bool SetByValue(int32_t id) {
+bool ByValue(int32_t id) {
     const ParamDesc* d = findParam(id);
-    return d != nullptr && (d->automationType == 2 || d->automationType == 3);
+    return d != nullptr && automatedByValue(*d);
 }
 
 }  // namespace
 
-CoreAutomationSink::CoreAutomationSink(ReverbCore& core) : core_(core) {
-    for (int32_t id = 0; id < kSoundParamCount; ++id) byValue_[id] = SetByValue(id);
-}
+CoreAutomationSink::CoreAutomationSink(ReverbCore& core) : core_(core) {}
 
 void CoreAutomationSink::apply(int32_t id, float value) {
     if (id < 0 || id >= kSoundParamCount) return;
-    if (byValue_[id])
+    if (ByValue(id))
         core_.setValue(id, static_cast<int32_t>(value));
     else
         core_.setNormalized(id, value);
@@ -41,7 +38,7 @@ void CoreAutomationSink::refresh(int32_t id) { core_.notifyListeners(id); }
 
 float CoreAutomationSink::read(int32_t id) const {
     if (id < 0 || id >= kSoundParamCount) return 0.0f;
-    return byValue_[id] ? static_cast<float>(core_.getValue(id)) : core_.getNormalized(id);
+    return ByValue(id) ? static_cast<float>(core_.getValue(id)) : core_.getNormalized(id);
 }
 
 void Automation::setSampleRate(uint32_t rate) { step_ = std::max<int32_t>(1, static_cast<int32_t>(rate / 200)); }

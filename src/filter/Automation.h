@@ -33,8 +33,8 @@ public:
 };
 
 // Sets a core's sound parameters from automation values: by integer value for switch and list
-// parameters, by position for the others. Reads each parameter's kind once, at construction, so that
-// applying a value copies no description.
+// parameters, by position for the others. The kind is read from the constant parameter table, so applying
+// a value copies no description.
 class CoreAutomationSink : public AutomationSink {
 public:
     explicit CoreAutomationSink(ReverbCore& core);
@@ -45,7 +45,6 @@ public:
 
 private:
     ReverbCore& core_;
-    bool byValue_[kSoundParamCount] = {};
 };
 
 class Automation {

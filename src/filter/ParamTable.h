@@ -56,6 +56,10 @@ struct ParamDesc {
     double scale;  // 10^decimals
 };
 
+// Automation types 2 (switch) and 3 (list) are automated by integer value and name their unit; every other
+// parameter is automated by its 0..1 position.
+constexpr bool automatedByValue(const ParamDesc& d) { return d.automationType == 2 || d.automationType == 3; }
+
 // A description from its table row; a taper base of 0 means the linear curve.
 constexpr ParamDesc makeParam(const char* name, int32_t defaultValue, int32_t decimals, int32_t width,
                               int32_t minimum, int32_t maximum, const char* maxText, const char* minText,

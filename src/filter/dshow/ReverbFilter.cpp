@@ -45,13 +45,10 @@ HRESULT StereoCopyOf(const AM_MEDIA_TYPE* src, AM_MEDIA_TYPE* dst) {
     return S_OK;
 }
 
-// Parameter records for the media-parameter descriptions; false for an index that is not published.
 // The description of a media parameter: a pointer into the constant table, null for an index beyond it.
 const ParamDesc* Describe(DWORD index) {
     return index < kMediaParamCount ? findParam(static_cast<int32_t>(index)) : nullptr;
 }
-
-bool ShowsUnit(const ParamDesc& d) { return d.automationType == 2 || d.automationType == 3; }
 
 // Copies ANSI text into a wide buffer of capacity characters, always terminated.
 void AnsiToWide(const char* text, WCHAR* out, int capacity) {
@@ -521,7 +518,7 @@ STDMETHODIMP ReverbFilter::GetParamInfo(DWORD index, MP_PARAMINFO* info) {
             info->mpdNeutralValue = core->getNormalized(d.id);
         }
         AnsiToWide(d.name, info->szLabel, 32);
-        AnsiToWide(ShowsUnit(d) ? d.label : "", info->szUnitText, 32);
+        AnsiToWide(automatedByValue(d) ? d.label : "", info->szUnitText, 32);
         return S_OK;
     });
 }
@@ -545,7 +542,7 @@ STDMETHODIMP ReverbFilter::GetParamText(DWORD index, WCHAR** text) {
             at += static_cast<int>(wcslen(block + at)) + 1;
         };
         append(d.name);
-        append(ShowsUnit(d) ? d.label : "");
+        append(automatedByValue(d) ? d.label : "");
         *text = block;
         return S_OK;
     });
