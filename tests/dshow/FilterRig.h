@@ -17,6 +17,18 @@ namespace test {
 
 using dshow::ComRef;
 
+template <class I>
+inline ComRef<I> Query(IUnknown* u) {
+    ComRef<I> p;
+    u->QueryInterface(__uuidof(I), reinterpret_cast<void**>(p.put()));
+    return p;
+}
+
+template <class I>
+inline HRESULT Create(REFCLSID clsid, ComRef<I>& out) {
+    return CoCreateInstance(clsid, nullptr, CLSCTX_INPROC_SERVER, __uuidof(I), reinterpret_cast<void**>(out.put()));
+}
+
 // An audio media type with a plain or extensible wave format.
 struct WaveType {
     AM_MEDIA_TYPE mt{};
@@ -56,9 +68,7 @@ struct FilterHolder {
     FilterHolder(const FilterHolder&) = delete;
     template <class I>
     ComRef<I> As() {
-        ComRef<I> p;
-        inner->QueryInterface(__uuidof(I), reinterpret_cast<void**>(p.put()));
-        return p;
+        return Query<I>(inner);
     }
     ReverbCore* Core() { return filter->Control().GetCore(); }
     // Formats of 16-bit stereo at a rate on both sides, dry only, streaming started: ready for direct
@@ -175,9 +185,7 @@ struct Rig {
         if (filter->GetPin(0) == nullptr) return E_OUTOFMEMORY;  // the pins are made on first use
         HRESULT hr = filter->GetPin(0)->ReceiveConnection(&upstream, type);
         if (SUCCEEDED(hr)) hr = filter->GetPin(1)->Connect(&downstream, nullptr);
-        if (SUCCEEDED(hr))
-            hr = CoCreateInstance(CLSID_MemoryAllocator, nullptr, CLSCTX_INPROC_SERVER, IID_IMemAllocator,
-                                  reinterpret_cast<void**>(source.put()));
+        if (SUCCEEDED(hr)) hr = Create(CLSID_MemoryAllocator, source);
         if (FAILED(hr)) return hr;
         ALLOCATOR_PROPERTIES want{1, 1 << 16, 1, 0}, got{};
         source->SetProperties(&want, &got);
@@ -207,9 +215,7 @@ struct Rig {
         REFERENCE_TIME stop = start + static_cast<REFERENCE_TIME>(samples.size() / 2) * 10000000 / rate;
         s->SetTime(&start, &stop);
         s->SetDiscontinuity(discontinuity);
-        ComRef<IMemInputPin> in;
-        filter->GetPin(0)->QueryInterface(IID_IMemInputPin, reinterpret_cast<void**>(in.put()));
-        return in->Receive(s.get());
+        return Query<IMemInputPin>(filter->GetPin(0))->Receive(s.get());
     }
     std::vector<int16_t> Output() const {
         std::vector<int16_t> all;

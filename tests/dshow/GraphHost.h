@@ -61,18 +61,6 @@ inline ComRef<IPin> FindPin(IBaseFilter* f, PIN_DIRECTION dir) {
     return ComRef<IPin>();
 }
 
-template <class I>
-inline ComRef<I> Query(IUnknown* u) {
-    ComRef<I> p;
-    u->QueryInterface(__uuidof(I), reinterpret_cast<void**>(p.put()));
-    return p;
-}
-
-template <class I>
-inline HRESULT Create(REFCLSID clsid, ComRef<I>& out) {
-    return CoCreateInstance(clsid, nullptr, CLSCTX_INPROC_SERVER, __uuidof(I), reinterpret_cast<void**>(out.put()));
-}
-
 // Runs a WAV file through the filter. state: an 88-byte settings record to load first (may be empty).
 // replay: after the end of the stream, seek back to the start while running and play it once more.
 inline GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state,

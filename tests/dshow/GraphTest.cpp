@@ -1,18 +1,10 @@
 // Ulvetta.ax registered and run in real graphs of the platform's DirectShow: output equal to the
 // command-line renderer's for the same file and settings, the tail drain, and seeking through the filter.
-#include <windows.h>
-#include <dshow.h>
-#include <mmreg.h>
-
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <algorithm>
-#include <cstring>
+#include <cmath>
 #include <fstream>
-#include <sstream>
-#include <string>
-#include <vector>
 
 #include "GraphHost.h"
 #include "filter/CoreState.h"
@@ -30,17 +22,11 @@ std::wstring WinePath(const std::string& posix) {
     return w;
 }
 
-std::string CasesDir() { return ULVETTA_GRAPH_CASES; }
-
-using RegisterFn = HRESULT(WINAPI*)();
-
-HMODULE Module() {
-    static HMODULE m = LoadLibraryW(WinePath(ULVETTA_AX_PATH).c_str());
-    return m;
-}
+const std::string kCases = ULVETTA_GRAPH_CASES;
 
 HRESULT CallExport(const char* name) {
-    auto fn = reinterpret_cast<RegisterFn>(reinterpret_cast<void*>(GetProcAddress(Module(), name)));
+    static HMODULE module = LoadLibraryW(WinePath(ULVETTA_AX_PATH).c_str());
+    auto fn = reinterpret_cast<HRESULT(WINAPI*)()>(reinterpret_cast<void*>(GetProcAddress(module, name)));
     return fn ? fn() : E_NOTIMPL;
 }
 
@@ -57,9 +43,7 @@ std::vector<unsigned char> ReadFile(const std::string& path) {
     return std::vector<unsigned char>((std::istreambuf_iterator<char>(f)), std::istreambuf_iterator<char>());
 }
 
-
 }  // namespace
-
 
 TEST(Server, UnregisteringRemovesEveryKeyAndTheModuleUnloadsOnlyWhenUnused) {
     ASSERT_EQ(CallExport("DllUnregisterServer"), S_OK);
@@ -80,25 +64,20 @@ TEST(Server, UnregisteringRemovesEveryKeyAndTheModuleUnloadsOnlyWhenUnused) {
 // Each case: a WAV file, a settings record and the command-line renderer's output for them (raw floats),
 // made by the fixture script.
 TEST(Graph, OutputEqualsTheCommandLineRendererAndTheTailDrains) {
-    std::ifstream list(CasesDir() + "/cases.txt");
-    ASSERT_TRUE(list.good()) << "no graph cases in " << CasesDir();
-    std::string line;
+    std::ifstream list(kCases + "/cases.txt");
+    ASSERT_TRUE(list.good()) << "no graph cases in " << kCases;
     int cases = 0;
-    while (std::getline(list, line)) {
-        std::istringstream fields(line);
-        std::string name, wav, state, ref;
-        fields >> name >> wav >> state >> ref;
-        if (name.empty()) continue;
+    for (std::string name, wav, state, ref; list >> name >> wav >> state >> ref;) {
         SCOPED_TRACE(name);
         ++cases;
-        GraphResult r = RunGraph(WinePath(CasesDir() + "/" + wav), ReadFile(CasesDir() + "/" + state));
+        GraphResult r = RunGraph(WinePath(kCases + "/" + wav), ReadFile(kCases + "/" + state));
         ASSERT_EQ(r.hr, S_OK) << r.step;
         ASSERT_TRUE(r.completed);
         // Float files reach the filter as WAVE_FORMAT_EXTENSIBLE; downstream gets a copy of that type.
         const bool pcm16 = name.find("s16") != std::string::npos;
         EXPECT_EQ(r.format.wFormatTag, pcm16 ? WAVE_FORMAT_PCM : WAVE_FORMAT_EXTENSIBLE);
         EXPECT_EQ(r.format.cbSize, 0);
-        const std::vector<unsigned char> raw = ReadFile(CasesDir() + "/" + ref);
+        const std::vector<unsigned char> raw = ReadFile(kCases + "/" + ref);
         std::vector<float> expected(raw.size() / 4);
         std::memcpy(expected.data(), raw.data(), raw.size() / 4 * 4);
         ASSERT_GT(expected.size(), 0u);
@@ -126,7 +105,7 @@ TEST(Graph, SeekingPassesThroughAndASeekAfterTheEndPlaysOnUntrimmed) {
     core.setValue(kOutputLevelWet, -600);  // dry only: every input frame shows in the output
     std::vector<unsigned char> state(kCoreStateSize);
     core.saveState(state.data());
-    GraphResult r = RunGraph(WinePath(CasesDir() + "/dc-silence-44100-f32.wav"), state, true);
+    GraphResult r = RunGraph(WinePath(kCases + "/dc-silence-44100-f32.wav"), state, true);
     ASSERT_EQ(r.hr, S_OK) << r.step;
     EXPECT_EQ(r.duration, 6000000);  // 0.6 s, from the parser through the output pin's pass-through
     ASSERT_TRUE(r.completed);
