@@ -148,12 +148,7 @@ public:
     STDMETHODIMP ReceiveMultiple(IMediaSample**, long, long*) override { return E_NOTIMPL; }
     STDMETHODIMP ReceiveCanBlock() override { return S_FALSE; }
 
-    struct Delivered {
-        bool timed;
-        REFERENCE_TIME start;
-        bool discontinuity;
-        std::vector<BYTE> bytes;
-    };
+    struct Delivered { bool timed; REFERENCE_TIME start; bool discontinuity; std::vector<BYTE> bytes; };
     std::vector<Delivered> delivered;
     bool recording = true;  // off: samples are accepted and dropped, nothing is allocated
     int endOfStreams = 0;

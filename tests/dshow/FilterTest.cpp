@@ -33,14 +33,7 @@ std::vector<uint8_t> StateWithSizeField(uint32_t size, size_t total) {
 TEST(FilterFormats, AcceptsStereo16BitAndFloatOnly) {
     FilterHolder f;
     ReverbFilter* r = f.filter;
-    struct Case {
-        WORD tag, channels;
-        DWORD rate;
-        WORD bits;
-        bool extensible;
-        GUID sub;
-        HRESULT expected;
-    } cases[] = {
+    const struct { WORD tag, channels; DWORD rate; WORD bits; bool extensible; GUID sub; HRESULT expected; } cases[] = {
         {WAVE_FORMAT_PCM, 2, 1, 16, false, GUID_NULL, S_OK},
         {WAVE_FORMAT_IEEE_FLOAT, 2, 768000, 32, false, GUID_NULL, S_OK},
         {0, 2, 48000, 16, true, MEDIASUBTYPE_PCM, S_OK},
@@ -54,7 +47,7 @@ TEST(FilterFormats, AcceptsStereo16BitAndFloatOnly) {
         {WAVE_FORMAT_PCM, 2, 768001, 16, false, GUID_NULL, E_INVALIDARG},
         {0, 2, 48000, 16, true, MEDIATYPE_Video, E_INVALIDARG},
     };
-    for (const Case& c : cases)
+    for (const auto& c : cases)
         EXPECT_EQ(r->CheckInputType(WaveType(c.tag, c.channels, c.rate, c.bits, c.extensible, c.sub)), c.expected)
             << c.tag << "/" << c.channels << "/" << c.rate << "/" << c.bits;
     WaveType shortExtensible(0, 2, 48000, 16, true, MEDIASUBTYPE_PCM);
@@ -78,19 +71,17 @@ TEST(FilterState, SaveLoadRoundTripAndTheDirtyFlag) {
     auto pa = a.As<IPersistStream>();
     EXPECT_EQ(pa->IsDirty(), S_OK);  // the option set at construction
     ComRef<IStream> s = StreamOf({});
-    ASSERT_EQ(pa->Save(s.get(), FALSE), S_OK);
+    ASSERT_EQ(pa->Save(StreamOf({}).get(), FALSE), S_OK);
     EXPECT_EQ(pa->IsDirty(), S_OK);  // saved without clearing
     ASSERT_EQ(pa->Save(s.get(), TRUE), S_OK);
-    EXPECT_EQ(PositionOf(s.get()), 2u * 88);
+    EXPECT_EQ(PositionOf(s.get()), 88u);
     std::vector<int32_t> saved;
     for (int id = 0; id < kParamCount; ++id) saved.push_back(a.Core()->getValue(id));
     EXPECT_EQ(pa->IsDirty(), S_FALSE);
     a.Core()->setValue(kDecay, a.Core()->getValue(kDecay) + 1);  // as the editor would
     EXPECT_EQ(pa->IsDirty(), S_OK);
 
-    LARGE_INTEGER at88{};
-    at88.QuadPart = 88;
-    s->Seek(at88, STREAM_SEEK_SET, nullptr);
+    s->Seek(LARGE_INTEGER{}, STREAM_SEEK_SET, nullptr);
     auto pb = b.As<IPersistStream>();
     pb->Save(StreamOf({}).get(), TRUE);
     ASSERT_EQ(pb->Load(s.get()), S_OK);
@@ -102,18 +93,14 @@ TEST(FilterState, BadRecordsFailWithoutChangingAnythingOrAllocatingTheirClaim) {
     FilterHolder f;
     f.Core()->setValue(kDecay, 77);
     auto p = f.As<IPersistStream>();
-    struct Case {
-        uint32_t sizeField;
-        size_t streamBytes;
-        uint64_t expectedPosition;
-    } cases[] = {
+    const struct { uint32_t sizeField; size_t streamBytes; uint64_t expectedPosition; } cases[] = {
         {16, 200, 20},              // too small: only the header is read
         {92, 200, 92},              // another size: consumed whole
         {88, 60, 60},               // truncated record
         {4096, 5000, 4096},         // larger than any record: consumed in chunks
         {0xFFFFFFFFu, 3000, 3000},  // 4 GB claimed: read to the stream's end, never allocated
     };
-    for (const Case& c : cases) {
+    for (const auto& c : cases) {
         ComRef<IStream> s = StreamOf(StateWithSizeField(c.sizeField, c.streamBytes));
         EXPECT_EQ(p->Load(s.get()), E_UNEXPECTED) << c.sizeField;
         EXPECT_EQ(PositionOf(s.get()), c.expectedPosition) << c.sizeField;
