@@ -17,6 +17,18 @@ namespace test {
 
 using dshow::ComRef;
 
+template <class I>
+inline ComRef<I> Query(IUnknown* u) {
+    ComRef<I> p;
+    u->QueryInterface(__uuidof(I), reinterpret_cast<void**>(p.put()));
+    return p;
+}
+
+template <class I>
+inline HRESULT Create(REFCLSID clsid, ComRef<I>& out) {
+    return CoCreateInstance(clsid, nullptr, CLSCTX_INPROC_SERVER, __uuidof(I), reinterpret_cast<void**>(out.put()));
+}
+
 // An audio media type with a plain or extensible wave format.
 struct WaveType {
     AM_MEDIA_TYPE mt{};
@@ -50,18 +62,13 @@ struct FilterHolder {
         HRESULT hr = E_FAIL;
         inner = dshow::ReverbFilter::CreateInstance(nullptr, &hr);
         inner->AddRef();
-        IBaseFilter* base = nullptr;
-        inner->QueryInterface(IID_IBaseFilter, reinterpret_cast<void**>(&base));
-        filter = static_cast<dshow::ReverbFilter*>(base);
-        base->Release();
+        filter = static_cast<dshow::ReverbFilter*>(As<IBaseFilter>().get());
     }
     ~FilterHolder() { inner->Release(); }
     FilterHolder(const FilterHolder&) = delete;
     template <class I>
     ComRef<I> As() {
-        ComRef<I> p;
-        inner->QueryInterface(__uuidof(I), reinterpret_cast<void**>(p.put()));
-        return p;
+        return Query<I>(inner);
     }
     ReverbCore* Core() { return filter->Control().GetCore(); }
     // Formats of 16-bit stereo at a rate on both sides, dry only, streaming started: ready for direct
@@ -70,9 +77,13 @@ struct FilterHolder {
         WaveType pcm(WAVE_FORMAT_PCM, 2, rate, 16);
         filter->SetMediaType(PINDIR_INPUT, pcm);
         filter->SetMediaType(PINDIR_OUTPUT, pcm);
+        Dry();
+        Core()->startStreaming();
+    }
+    // No reverb and no pre-delay: the output is the input.
+    void Dry() {
         Core()->setValue(kOutputLevelWet, -600);
         Core()->setValue(kPreDelay, 0);
-        Core()->startStreaming();
     }
 };
 
@@ -82,56 +93,39 @@ class StandInPin : public IPin, public IMemInputPin {
 public:
     StandInPin(PIN_DIRECTION dir, long bufferBytes) : dir_(dir), bufferBytes_(bufferBytes) {}
     STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-        if (riid == IID_IUnknown || riid == IID_IPin)
-            *ppv = static_cast<IPin*>(this);
-        else if (riid == IID_IMemInputPin && dir_ == PINDIR_INPUT)
-            *ppv = static_cast<IMemInputPin*>(this);
-        else {
-            *ppv = nullptr;
-            return E_NOINTERFACE;
-        }
-        return S_OK;
+        *ppv = riid == IID_IUnknown || riid == IID_IPin ? static_cast<void*>(static_cast<IPin*>(this))
+               : riid == IID_IMemInputPin && dir_ == PINDIR_INPUT ? static_cast<IMemInputPin*>(this)
+                                                                  : nullptr;
+        return *ppv ? S_OK : E_NOINTERFACE;
     }
     STDMETHODIMP_(ULONG) AddRef() override { return 2; }
     STDMETHODIMP_(ULONG) Release() override { return 1; }
-    STDMETHODIMP Connect(IPin*, const AM_MEDIA_TYPE*) override { return E_NOTIMPL; }
     STDMETHODIMP ReceiveConnection(IPin* connector, const AM_MEDIA_TYPE*) override {
         connected = connector;
         return S_OK;
     }
     STDMETHODIMP Disconnect() override { connected = nullptr; return S_OK; }
     STDMETHODIMP ConnectedTo(IPin** pin) override { *pin = connected; return connected ? S_OK : VFW_E_NOT_CONNECTED; }
-    STDMETHODIMP ConnectionMediaType(AM_MEDIA_TYPE*) override { return E_NOTIMPL; }
     STDMETHODIMP QueryPinInfo(PIN_INFO* info) override {
         std::memset(info, 0, sizeof *info);
         info->dir = dir_;
         return S_OK;
     }
     STDMETHODIMP QueryDirection(PIN_DIRECTION* dir) override { *dir = dir_; return S_OK; }
-    STDMETHODIMP QueryId(LPWSTR*) override { return E_NOTIMPL; }
-    STDMETHODIMP QueryAccept(const AM_MEDIA_TYPE*) override { return S_OK; }
-    STDMETHODIMP EnumMediaTypes(IEnumMediaTypes**) override { return E_NOTIMPL; }
-    STDMETHODIMP QueryInternalConnections(IPin**, ULONG*) override { return E_NOTIMPL; }
     STDMETHODIMP EndOfStream() override {
         ++endOfStreams;
         if (onEndOfStream) onEndOfStream();
         return S_OK;
     }
-    STDMETHODIMP BeginFlush() override { return S_OK; }
-    STDMETHODIMP EndFlush() override { return S_OK; }
-    STDMETHODIMP NewSegment(REFERENCE_TIME, REFERENCE_TIME, double) override { return S_OK; }
-    STDMETHODIMP GetAllocator(IMemAllocator**) override { return VFW_E_NO_ALLOCATOR; }
-    STDMETHODIMP NotifyAllocator(IMemAllocator*, BOOL) override { return S_OK; }
     STDMETHODIMP GetAllocatorRequirements(ALLOCATOR_PROPERTIES* p) override {
         *p = ALLOCATOR_PROPERTIES{2, bufferBytes_, 1, 0};
         return S_OK;
     }
     STDMETHODIMP Receive(IMediaSample* s) override {
         if (!recording) return S_OK;
-        Delivered d;
-        REFERENCE_TIME a = 0, b = 0;
-        d.timed = s->GetTime(&a, &b) == S_OK;
-        d.start = a;
+        Delivered d{};
+        REFERENCE_TIME stop = 0;
+        d.timed = s->GetTime(&d.start, &stop) == S_OK;
         d.discontinuity = s->IsDiscontinuity() == S_OK;
         BYTE* p = nullptr;
         s->GetPointer(&p);
@@ -139,15 +133,22 @@ public:
         delivered.push_back(d);
         return S_OK;
     }
+    // What the filter never needs from its neighbours.
+    STDMETHODIMP Connect(IPin*, const AM_MEDIA_TYPE*) override { return E_NOTIMPL; }
+    STDMETHODIMP ConnectionMediaType(AM_MEDIA_TYPE*) override { return E_NOTIMPL; }
+    STDMETHODIMP QueryId(LPWSTR*) override { return E_NOTIMPL; }
+    STDMETHODIMP QueryAccept(const AM_MEDIA_TYPE*) override { return S_OK; }
+    STDMETHODIMP EnumMediaTypes(IEnumMediaTypes**) override { return E_NOTIMPL; }
+    STDMETHODIMP QueryInternalConnections(IPin**, ULONG*) override { return E_NOTIMPL; }
+    STDMETHODIMP BeginFlush() override { return S_OK; }
+    STDMETHODIMP EndFlush() override { return S_OK; }
+    STDMETHODIMP NewSegment(REFERENCE_TIME, REFERENCE_TIME, double) override { return S_OK; }
+    STDMETHODIMP GetAllocator(IMemAllocator**) override { return VFW_E_NO_ALLOCATOR; }
+    STDMETHODIMP NotifyAllocator(IMemAllocator*, BOOL) override { return S_OK; }
     STDMETHODIMP ReceiveMultiple(IMediaSample**, long, long*) override { return E_NOTIMPL; }
     STDMETHODIMP ReceiveCanBlock() override { return S_FALSE; }
 
-    struct Delivered {
-        bool timed;
-        REFERENCE_TIME start;
-        bool discontinuity;
-        std::vector<BYTE> bytes;
-    };
+    struct Delivered { bool timed; REFERENCE_TIME start; bool discontinuity; std::vector<BYTE> bytes; };
     std::vector<Delivered> delivered;
     bool recording = true;  // off: samples are accepted and dropped, nothing is allocated
     int endOfStreams = 0;
@@ -172,17 +173,14 @@ struct Rig {
     Rig(DWORD rate, long outputBufferBytes, bool pcm16 = true)
         : downstream(PINDIR_INPUT, outputBufferBytes),
           type(pcm16 ? WAVE_FORMAT_PCM : WAVE_FORMAT_IEEE_FLOAT, 2, rate, pcm16 ? 16 : 32) {
-        holder.Core()->setValue(kOutputLevelWet, -600);
-        holder.Core()->setValue(kPreDelay, 0);
+        holder.Dry();
     }
     ~Rig() { filter->Stop(); }
     HRESULT Connect() {
         if (filter->GetPin(0) == nullptr) return E_OUTOFMEMORY;  // the pins are made on first use
         HRESULT hr = filter->GetPin(0)->ReceiveConnection(&upstream, type);
         if (SUCCEEDED(hr)) hr = filter->GetPin(1)->Connect(&downstream, nullptr);
-        if (SUCCEEDED(hr))
-            hr = CoCreateInstance(CLSID_MemoryAllocator, nullptr, CLSCTX_INPROC_SERVER, IID_IMemAllocator,
-                                  reinterpret_cast<void**>(source.put()));
+        if (SUCCEEDED(hr)) hr = Create(CLSID_MemoryAllocator, source);
         if (FAILED(hr)) return hr;
         ALLOCATOR_PROPERTIES want{1, 1 << 16, 1, 0}, got{};
         source->SetProperties(&want, &got);
@@ -212,9 +210,7 @@ struct Rig {
         REFERENCE_TIME stop = start + static_cast<REFERENCE_TIME>(samples.size() / 2) * 10000000 / rate;
         s->SetTime(&start, &stop);
         s->SetDiscontinuity(discontinuity);
-        ComRef<IMemInputPin> in;
-        filter->GetPin(0)->QueryInterface(IID_IMemInputPin, reinterpret_cast<void**>(in.put()));
-        return in->Receive(s.get());
+        return Query<IMemInputPin>(filter->GetPin(0))->Receive(s.get());
     }
     std::vector<int16_t> Output() const {
         std::vector<int16_t> all;

@@ -28,36 +28,31 @@ TEST(Streaming, OneInputSampleSpreadsOverSmallOutputBuffers) {
     EXPECT_EQ(rig.Output(), in);  // every frame once, in order
 }
 
-TEST(Streaming, ABlockLargerThanTheScratchRunsInPieces) {
-    FilterHolder f;
-    f.StartDry16(8000);
-    const std::vector<int16_t> in = Ramp(5000);  // more than the scratch made before any allocator is known
-    std::vector<int16_t> out(in.size());
-    bool shortfall = true;
-    ASSERT_EQ(f.filter->Control().Process(kModeDiscontinuity, reinterpret_cast<const BYTE*>(in.data()), 5000,
-                                          reinterpret_cast<BYTE*>(out.data()), 5000, &shortfall),
-              5000);
-    EXPECT_FALSE(shortfall);
-    EXPECT_EQ(out, in);
-}
+TEST(Streaming, DirectProcessingRunsLargeBlocksInPiecesAndClampsSixteenBitOutput) {
+    FilterHolder a, b;
+    auto process = [](FilterHolder& f, int mode, const std::vector<int16_t>& in) {
+        std::vector<int16_t> out(in.size());
+        const int frames = static_cast<int>(in.size() / 2);
+        bool shortfall = true;
+        EXPECT_EQ(f.filter->Control().Process(mode, reinterpret_cast<const BYTE*>(in.data()), frames,
+                                              reinterpret_cast<BYTE*>(out.data()), frames, &shortfall),
+                  frames);
+        EXPECT_FALSE(shortfall);
+        return out;
+    };
+    a.StartDry16(8000);
+    const std::vector<int16_t> ramp = Ramp(5000);  // more than the scratch made before any allocator is known
+    EXPECT_EQ(process(a, kModeDiscontinuity, ramp), ramp);
 
-TEST(Streaming, SixteenBitOutputClampsAndTruncates) {
-    FilterHolder f;
-    f.StartDry16(44100);
-    f.Core()->setValue(kOutputLevelDry, 60);  // +6 dB
-    const int16_t in[8] = {32767, -32768, 100, -101, 20000, -20000, 0, 1};
-    int16_t out[8] = {};
-    bool shortfall = true;
-    ASSERT_EQ(f.filter->Control().Process(kModeOrdinary, reinterpret_cast<const BYTE*>(in), 4,
-                                          reinterpret_cast<BYTE*>(out), 4, &shortfall),
-              4);
-    EXPECT_FALSE(shortfall);
+    b.StartDry16(44100);
+    b.Core()->setValue(kOutputLevelDry, 60);  // +6 dB
     const double g = std::pow(10.0, 0.3);
-    const int16_t expected[8] = {32767, -32768,
-                                 static_cast<int16_t>(std::trunc(static_cast<float>(100 / 32768.0f * g) * 32768.0)),
-                                 static_cast<int16_t>(std::trunc(static_cast<float>(-101 / 32768.0f * g) * 32768.0)),
-                                 32767, -32768, 0, 1};  // clamped, never wrapped; 1.995 truncates to 1
-    for (int i = 0; i < 8; ++i) EXPECT_EQ(out[i], expected[i]) << i;
+    auto gained = [g](int v) {
+        return static_cast<int16_t>(std::trunc(static_cast<float>(v / 32768.0f * g) * 32768.0));
+    };
+    // Clamped, never wrapped; 1.995 truncates to 1.
+    EXPECT_EQ(process(b, kModeOrdinary, {32767, -32768, 100, -101, 20000, -20000, 0, 1}),
+              (std::vector<int16_t>{32767, -32768, gained(100), gained(-101), 32767, -32768, 0, 1}));
 }
 
 TEST(Streaming, EndOfStreamDrainsTheTailAndPassesTheEndOn) {
@@ -73,26 +68,6 @@ TEST(Streaming, EndOfStreamDrainsTheTailAndPassesTheEndOn) {
     // Full buffers of tail, then one partial (or none) before the end of stream.
     for (size_t i = before; i + 1 < d.size(); ++i) EXPECT_EQ(d[i].bytes.size(), 1024u) << i;
     EXPECT_LE(d.back().bytes.size(), 1024u);
-}
-
-TEST(Streaming, AutomationAppliesInFiveMillisecondChunks) {
-    // At 8000 Hz a chunk is 40 frames: a segment starting inside a chunk takes effect at the next one.
-    for (int64_t segmentStart : {1000, 1010}) {
-        Rig rig(8000, 1 << 14);
-        ASSERT_EQ(rig.Connect(), S_OK);
-        MP_ENVELOPE_SEGMENT seg{};
-        seg.rtStart = segmentStart * 10000000 / 8000;
-        seg.rtEnd = seg.rtStart + 1000000;
-        seg.iCurve = MP_CURVE_JUMP;  // "Output Level Dry" at 0: -Inf
-        ASSERT_EQ(rig.holder.As<IMediaParams>()->AddEnvelope(kOutputLevelDry, 1, &seg), S_OK);
-        ASSERT_EQ(rig.Send(Ramp(2000), 0, true), S_OK);
-        const std::vector<int16_t> out = rig.Output();
-        ASSERT_EQ(out.size(), 4000u);
-        int firstSilent = -1;
-        for (int i = 0; i < 2000 && firstSilent < 0; ++i)
-            if (out[2 * i] == 0) firstSilent = i;
-        EXPECT_EQ(firstSilent, segmentStart == 1000 ? 1000 : 1040);
-    }
 }
 
 TEST(Streaming, PausingWithNoInputEndsTheStreamDownstreamWithoutHoldingTheStateLock) {
@@ -117,14 +92,9 @@ TEST(Streaming, PausingWithNoInputEndsTheStreamDownstreamWithoutHoldingTheStateL
 TEST(Streaming, StateChangesConnectionsAndTheOfferedType) {
     Rig rig(44100, 4096);
     ASSERT_EQ(rig.Connect(), S_OK);
-    FILTER_STATE s;
-    EXPECT_EQ(rig.filter->GetState(0, &s), S_OK);
-    EXPECT_EQ(s, State_Paused);
     EXPECT_EQ(rig.filter->GetPin(0)->Disconnect(), VFW_E_NOT_STOPPED);
-    EXPECT_EQ(rig.filter->Run(0), S_OK);
     EXPECT_EQ(rig.filter->Stop(), S_OK);
     EXPECT_EQ(rig.Send(Ramp(16), 0, false), VFW_E_WRONG_STATE);
-    EXPECT_EQ(rig.filter->GetPin(0)->ReceiveConnection(&rig.upstream, rig.type), VFW_E_ALREADY_CONNECTED);
     // Another input format while the output is connected needs the output reconnected, which only a
     // graph can do.
     ASSERT_EQ(rig.filter->GetPin(0)->Disconnect(), S_OK);
@@ -150,7 +120,6 @@ TEST(Streaming, StateChangesConnectionsAndTheOfferedType) {
     EXPECT_EQ(w->SubFormat, MEDIASUBTYPE_IEEE_FLOAT);
     FreeMediaType(offered);
     EXPECT_EQ(rig.filter->GetMediaType(1, &offered), VFW_S_NO_MORE_ITEMS);
-    EXPECT_EQ(rig.filter->GetMediaType(-1, &offered), E_INVALIDARG);
     // The copy is taken downstream and the stream runs as float.
     ASSERT_EQ(rig.filter->GetPin(1)->Connect(&rig.downstream, nullptr), S_OK);
     EXPECT_EQ(EngineProbe(rig.filter->Control().GetCore()->engineForInspection()).sampleRate(), 48000);

@@ -1,27 +1,16 @@
 #!/usr/bin/env bash
-# Checks the import and export tables of Ulvetta.ax (system DLLs only, the four COM server exports) and that
-# it carries its resources.
+# Checks that Ulvetta.ax imports system DLLs only, exports exactly the four COM server entry points and
+# carries its resources.
 set -euo pipefail
-module="$1"
-dump=$(x86_64-w64-mingw32-objdump -p "$module")
-imports=$(printf '%s\n' "$dump" | sed -n 's/^\s*DLL Name: //p' | tr 'A-Z' 'a-z' | sort -u)
-allowed="advapi32.dll gdi32.dll kernel32.dll msvcrt.dll ole32.dll oleaut32.dll user32.dll"
+dump=$(x86_64-w64-mingw32-objdump -p -h "$1")
+imports=$(printf '%s\n' "$dump" | sed -n 's/^\s*DLL Name: //p' | tr 'A-Z' 'a-z' | sort -u | tr '\n' ' ')
+foreign=$(printf '%s\n' $imports | grep -vxE '(advapi32|gdi32|kernel32|msvcrt|ole32|oleaut32|user32)\.dll' || true)
+exports=$(printf '%s\n' "$dump" | sed -n '/\[Ordinal\/Name Pointer\] Table/,/^$/p' | grep -o 'Dll[A-Za-z]*' |
+  sort | tr '\n' ' ' || true)
 status=0
-for dll in $imports; do
-  case " $allowed " in
-    *" $dll "*) ;;
-    *) echo "Ulvetta.ax imports $dll, which is not a system DLL"; status=1 ;;
-  esac
-done
-exports=$(printf '%s\n' "$dump" | sed -n '/\[Ordinal\/Name Pointer\] Table/,/^$/p' | grep -o 'Dll[A-Za-z]*' | sort | tr '\n' ' ')
-expected="DllCanUnloadNow DllGetClassObject DllRegisterServer DllUnregisterServer "
-if [ "$exports" != "$expected" ]; then
-  echo "Ulvetta.ax exports '$exports', expected '$expected'"
-  status=1
-fi
-if ! x86_64-w64-mingw32-objdump -h "$module" | grep -q '\.rsrc'; then
-  echo "Ulvetta.ax has no resource section"
-  status=1
-fi
+[ -z "$foreign" ] || { echo "Ulvetta.ax imports DLLs that are not system DLLs: $foreign"; status=1; }
+[ "$exports" = "DllCanUnloadNow DllGetClassObject DllRegisterServer DllUnregisterServer " ] ||
+  { echo "Ulvetta.ax exports '$exports'"; status=1; }
+grep -q '\.rsrc' <<<"$dump" || { echo "Ulvetta.ax has no resource section"; status=1; }
 [ $status -eq 0 ] && echo "imports: $imports; exports: $exports"
 exit $status

@@ -5,21 +5,8 @@
 set -euo pipefail
 out="$1"
 cli="$2"
-if [ ! -x "$cli" ]; then
-  echo "the graph tests need the Linux renderer at $cli: build the native preset first" >&2
-  exit 1
-fi
-rm -rf "$out"
-mkdir -p "$out/presets"
-cd "$out"
-
-# A short stereo phrase: two tones with different envelopes per channel, and a noise burst.
-make_input() {  # file rate encoding...
-  local file="$1" rate="$2"
-  shift 2
-  sox -D -n -r "$rate" -c 2 "$@" "$file" synth 0.5 sine 440 sine 660 fade q 0.01 0.5 0.3 gain -14 \
-    : synth 0.15 pinknoise fade q 0.005 0.15 0.1 gain -18
-}
+[ -x "$cli" ] || { echo "the graph tests need the Linux renderer at $cli: build the native preset first" >&2; exit 1; }
+rm -rf "$out" && mkdir -p "$out/presets" && cd "$out"
 
 : > cases.txt
 add_case() {  # rate format algorithm
@@ -27,7 +14,9 @@ add_case() {  # rate format algorithm
   local name="alg${algorithm}-${rate}-${format}"
   local enc=(-b 16)
   [ "$format" = f32 ] && enc=(-e floating-point -b 32)
-  make_input "$name.wav" "$rate" "${enc[@]}"
+  # A short stereo phrase: two tones with different envelopes per channel, and a noise burst.
+  sox -D -n -r "$rate" -c 2 "${enc[@]}" "$name.wav" synth 0.5 sine 440 sine 660 fade q 0.01 0.5 0.3 gain -14 \
+    : synth 0.15 pinknoise fade q 0.005 0.15 0.1 gain -18
   "$cli" presets save "$name" --algorithm "$algorithm" --set "Output Level Wet=-12" --dir presets >/dev/null
   cp "presets/$name.stp" "$name.stp"
   # The WAVE parser delivers 40 ms per sample; the renderer uses the same block size.
@@ -42,14 +31,10 @@ add_case() {  # rate format algorithm
 }
 
 # Every algorithm once, at four rates in both sample formats.
-add_case 22050 s16 1
-add_case 22050 f32 3
-add_case 44100 s16 2
-add_case 44100 f32 4
-add_case 48000 s16 6
-add_case 48000 f32 5
-add_case 96000 s16 0
-add_case 96000 f32 7
+for c in "22050 s16 1" "22050 f32 3" "44100 s16 2" "44100 f32 4" "48000 s16 6" "48000 f32 5" "96000 s16 0" \
+         "96000 f32 7"; do
+  add_case $c
+done
 
 # 0.3 s of a constant 0.5 followed by 0.3 s of silence, for the seek test.
 perl -e 'print pack("f<", 0.5) x (2 * 13230), pack("f<", 0) x (2 * 13230)' > dc-silence.raw
