@@ -127,7 +127,8 @@ std::string ProfileFile::withValue(std::string_view text, std::string_view secti
     };
     for (size_t i = 0; i < lines.size(); ++i) {
         if (i == p.entry) {
-            put(entry);
+            // The key keeps its spelling; only the value changes.
+            put(std::string(lines[i].name) + "=" + std::string(value));
             continue;
         }
         put(lines[i].text);
