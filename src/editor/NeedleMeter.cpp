@@ -35,8 +35,10 @@ NeedleMeter::Needle NeedleMeter::needleAt(float level) const {
   const int dx = n.tipX - pivotX_, dy = pivotY_ - n.tipY;
   const double slope = dy == 0 ? 1.0 : static_cast<double>(dx) / dy;
   n.baseX = pivotX_ + static_cast<int>(std::round(slope * (pivotY_ - n.baseY)));
+  // Both ends inclusive, plus the column and row after them: the anti-aliased line shares each step with
+  // the next pixel, which rounding can touch even at an end point.
   const int left = std::min(n.baseX, n.tipX), top = std::min(n.baseY, n.tipY);
-  n.bounds = {left, top, std::max(n.baseX, n.tipX) - left + 1, std::max(n.baseY, n.tipY) - top + 1};
+  n.bounds = {left, top, std::max(n.baseX, n.tipX) - left + 2, std::max(n.baseY, n.tipY) - top + 2};
   return n;
 }
 
