@@ -76,7 +76,8 @@ void writeAll(int fd, const uint8_t* data, size_t size, const std::string& path)
         data += n;
         size -= static_cast<size_t>(n);
     }
-    if (::close(fd) != 0) throw CliError("cannot write " + inQuotes(path) + " (" + std::strerror(errno) + ")", kExitFailure);
+    if (::close(fd) != 0)
+        throw CliError("cannot write " + inQuotes(path) + " (" + std::strerror(errno) + ")", kExitFailure);
 }
 
 }  // namespace
@@ -119,8 +120,8 @@ void SnapshotCommand::run(const CLI::App& app) {
     host.settle();
     window.showPage(page);
     script.play(window, host);
-    if (haveLevel) {
-        // One tick lets the needle read the level.
+    if (haveLevel && window.currentPage() != kAboutPage) {
+        // One tick lets the needle read the level (on the about page it would advance the credits instead).
         window.tick();
         host.settle();
     }

@@ -153,6 +153,13 @@ void WorkingPage::destroyControls() {
 
 bool WorkingPage::columnShown(int32_t, int32_t) const { return true; }
 
+void WorkingPage::ColumnControls::show(bool shown) {
+  for (SkinControl* control : {static_cast<SkinControl*>(display), static_cast<SkinControl*>(fader)}) {
+    if (shown) control->enable();
+    else control->disable();
+  }
+}
+
 void WorkingPage::paintBackground(DibSurface* target) {
   drawAppearanceBackground(appearance_, target);
 
@@ -179,12 +186,7 @@ void WorkingPage::paintBackground(DibSurface* target) {
   for (const OptionalColumn& c : layout_.optional) {
     const bool shown = columnShown(c.paramId, algorithm);
     const auto it = columns_.find(c.paramId);
-    if (it != columns_.end()) {
-      for (SkinControl* control : {static_cast<SkinControl*>(it->second.display), static_cast<SkinControl*>(it->second.fader)}) {
-        if (shown) control->enable();
-        else control->disable();
-      }
-    }
+    if (it != columns_.end()) it->second.show(shown);
     if (!shown) continue;
     drawPicture(target, kVerticalGroove, c.grooveX, kGrooveY);
     drawPicture(target, kDisplayFrame, c.frameX, kFrameY);

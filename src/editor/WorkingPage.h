@@ -82,6 +82,8 @@ class WorkingPage : public SkinPanel, public CoreListener {
   struct ColumnControls {
     ValueDisplay* display;
     Fader* fader;
+    // Enables both, or disables them (then they neither paint nor respond).
+    void show(bool shown);
   };
   bool current() const;
   // Shows the other page (the button or TAB) and refreshes it whole.

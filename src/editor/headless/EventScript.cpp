@@ -17,9 +17,20 @@ struct MouseWord {
   const char* word;
   int event;
 };
-const MouseWord kMouseWords[] = {{"press", kLeftPress},        {"drag", kLeftDrag},     {"release", kLeftRelease},
-                                 {"move", kMove},              {"dblclick", kLeftDoubleClick},
-                                 {"rpress", kRightPress},      {"rrelease", kRightRelease}};
+const MouseWord kMouseWords[] = {
+    {"press", kLeftPress},           {"drag", kLeftDrag},     {"release", kLeftRelease},   {"move", kMove},
+    {"dblclick", kLeftDoubleClick}, {"rpress", kRightPress}, {"rrelease", kRightRelease},
+};
+
+// The events that take one count: a virtual-key code or a number of ticks.
+struct CountWord {
+  const char* word;
+  ScriptEvent::Kind kind;
+  long maximum;
+  const char* what;
+};
+const CountWord kCountWords[] = {{"key", ScriptEvent::kKey, 254, "virtual-key code"},
+                                 {"tick", ScriptEvent::kTick, 1000000, "count of ticks"}};
 
 // Virtual-key codes of the characters "type" accepts.
 constexpr int kKeyMinus = 189;
@@ -59,17 +70,11 @@ std::string parseLine(const std::string& line, std::vector<ScriptEvent>* events)
     return {};
   }
   if (modifiers != 0) return "ctrl and shift go only before a mouse event, not before " + verb;
-  if (verb == "key") {
-    ScriptEvent e{ScriptEvent::kKey};
-    if (args != 1 || !wholeNumber(words[1], 1, 254, &e.code))
-      return "key takes one virtual-key code from 1 to 254, not " + quoted;
-    events->push_back(e);
-    return {};
-  }
-  if (verb == "tick") {
-    ScriptEvent e{ScriptEvent::kTick};
-    if (args != 1 || !wholeNumber(words[1], 1, 1000000, &e.code))
-      return "tick takes one count of ticks from 1 to 1000000, not " + quoted;
+  for (const CountWord& w : kCountWords) {
+    if (verb != w.word) continue;
+    ScriptEvent e{w.kind};
+    if (args != 1 || !wholeNumber(words[1], 1, w.maximum, &e.code))
+      return verb + " takes one " + w.what + " from 1 to " + std::to_string(w.maximum) + ", not " + quoted;
     events->push_back(e);
     return {};
   }
