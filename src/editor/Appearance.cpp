@@ -6,6 +6,7 @@
 #include <filesystem>
 #include <limits>
 #include <system_error>
+#include <utility>
 
 #include "editor/EditorPage.h"
 #include "editor/EditorWindow.h"
@@ -184,25 +185,17 @@ void chooseBackgroundBitmap(EditorWindow& window, ReverbCore* core) {
 }
 
 bool runAppearanceCommand(int id, EditorWindow& window, ReverbCore* core) {
-  switch (id) {
-    case kSetBackgroundColour1:
-      chooseBackground1(window, core);
-      return true;
-    case kSetBackgroundColour2:
-      chooseBackground2(window, core);
-      return true;
-    case kLeftToRightGradient:
-      setGradientDirection(window, core);
-      return true;
-    case kSetMeterColour:
-      chooseMeterColour(window, core);
-      return true;
-    case kSetBackgroundBitmap:
-      chooseBackgroundBitmap(window, core);
-      return true;
-    default:
-      return false;
+  using Action = void (*)(EditorWindow&, ReverbCore*);
+  static constexpr std::pair<int, Action> kActions[] = {
+      {kSetBackgroundColour1, chooseBackground1}, {kSetBackgroundColour2, chooseBackground2},
+      {kLeftToRightGradient, setGradientDirection}, {kSetMeterColour, chooseMeterColour},
+      {kSetBackgroundBitmap, chooseBackgroundBitmap}};
+  for (const auto& [command, action] : kActions) {
+    if (command != id) continue;
+    action(window, core);
+    return true;
   }
+  return false;
 }
 
 }  // namespace ulvetta

@@ -23,7 +23,7 @@ struct AboutPageTest : ::testing::Test {
     rig.window.showPage(kAboutPage);
   }
   void ticks(int n) {
-    for (int i = 0; i < n; ++i) rig.window.tick();
+    while (n-- > 0) rig.window.tick();
   }
   // The pixels of r that differ between the back buffer and the reference.
   int differences(const EditorRect& r) {
@@ -50,13 +50,9 @@ struct AboutPageTest : ::testing::Test {
   DibSurface reference = test::EditorRig::background();
 };
 
-TEST_F(AboutPageTest, OpacityRisesOverFifteenTicksAndFallsOverTwenty) {
-  const AboutPage::CreditLine line{"x", 80, 159, 15, 20};
-  const std::pair<int, float> cases[] = {{80, 0.0f}, {94, 14.0f / 15.0f}, {95, 1.0f}, {139, 1.0f},
-                                         {140, 0.95f}, {159, 0.0f}};
-  for (const auto& [t, a] : cases) EXPECT_FLOAT_EQ(AboutPage::opacity(line, t), a) << t;
-  EXPECT_EQ(page->cycleLength(), 559);
-  EXPECT_EQ(page->creditLines().size(), 7u);
+TEST(AboutPage, OpacityRisesOverFifteenTicksAndFallsOverTwenty) {
+  const std::pair<int, float> cases[] = {{80, 0}, {94, 14.0f / 15}, {95, 1}, {139, 1}, {140, 0.95f}, {159, 0}};
+  for (const auto& [t, a] : cases) EXPECT_FLOAT_EQ(AboutPage::opacity({"x", 80, 159, 15, 20}, t), a) << t;
 }
 
 TEST_F(AboutPageTest, CreditCycleShowsFadesRestartsAndResumes) {
