@@ -19,10 +19,6 @@ HeadlessHost::HeadlessHost(std::string profilePath, std::string moduleFolder, st
       moduleFolder_(std::move(moduleFolder)),
       presetFolder_(std::move(presetFolder)) {}
 
-HeadlessHost::~HeadlessHost() {
-  if (window_ && window_->host() == this) window_->detach();
-}
-
 void HeadlessHost::show(EditorWindow* window) {
   window_ = window;
   if (!window) return;

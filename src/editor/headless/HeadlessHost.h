@@ -33,9 +33,8 @@ class HeadlessHost : public WindowHost {
 
   // profilePath may be empty (no appearance file); moduleFolder ends with a separator.
   HeadlessHost(std::string profilePath = {}, std::string moduleFolder = {}, std::string presetFolder = {});
-  ~HeadlessHost() override;
 
-  // Shows window: attaches this host to it; repaints go through it.
+  // Shows window: attaches this host to it; repaints go through it. The host must outlive the window.
   void show(EditorWindow* window);
   // The paint event the window system would send: a full repaint when something invalidated the window.
   void settle();
