@@ -29,7 +29,7 @@ class AboutPage : public SkinPanel, public PushButtonTarget {
   static constexpr int kPanelAlpha = 90;  // darkening of the panel at full opacity
 
   // Builds the page with its credit lines and registers it in window's slot 2; the slot is emptied again
-  // when the page is destroyed.
+  // when the page is destroyed, so the window must outlive the page.
   static std::unique_ptr<AboutPage> create(EditorWindow* window, ReverbCore* core);
   ~AboutPage() override;
 
