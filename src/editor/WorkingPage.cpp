@@ -27,8 +27,12 @@ constexpr int kGrooveY = 38, kFrameY = 15;
 constexpr int kHorizontalGrooveX = 558;
 constexpr int kHorizontalGrooveYs[] = {47, 68, 119};
 constexpr WorkingPage::Placed kCommonPictures[] = {
-    {kMeterFace, 87, 37}, {212, 556, 18} /* OUTPUT LEVELS */, {215, 556, 91} /* COLOUR */,
-    {210, 514, 43} /* DRY */, {206, 514, 61} /* WET */};
+    {kMeterFace, 87, 37},
+    {212, 556, 18},  // OUTPUT LEVELS
+    {215, 556, 91},  // COLOUR
+    {210, 514, 43},  // DRY
+    {206, 514, 61},  // WET
+};
 constexpr WorkingPage::Placed kAlgorithmBar{229, 557, 152};
 constexpr WorkingPage::Placed kPageLabel{233, 506, 126};
 constexpr WorkingPage::Placed kAlgorithmBox{222, 557, 139};

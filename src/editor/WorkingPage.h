@@ -95,7 +95,7 @@ class WorkingPage : public SkinPanel, public CoreListener {
   Layout layout_;
   AppearanceSet appearance_;
   BitmapFont font_;
-  std::unique_ptr<SkinImage> verticalThumb_, horizontalThumb_, logo_;
+  std::unique_ptr<SkinImage> verticalThumb_, horizontalThumb_;
   std::map<int, std::unique_ptr<SkinImage>> pictures_;
   std::map<int32_t, ColumnControls> columns_;
   ChoiceList* algorithmList_ = nullptr;
