@@ -69,6 +69,7 @@ TEST_F(CliTest, SnapshotRefusesBadInputAndWritesNothing) {
         {{"--events", "bad"}, "\"bad\" line 4: \"click 10 10\" is not an event"},
         {{"--events", "letters"}, "\"letters\" line 1: type takes digits"},
         {{"--events", "missing"}, "\"missing\" cannot be read"},
+        {{"--events", "."}, "\".\" cannot be read"},
         {{"--page", "mixer"}, "--page takes reverb, filter or about"},
         {{"--level", "1.5"}, "--level takes a number from 0 to 1"},
         {{"--profile", "none.ini"}, "\"none.ini\" does not exist"},

@@ -118,7 +118,10 @@ bool EventScript::parse(const std::string& text, const std::string& source, std:
 
 bool EventScript::load(const std::string& path, std::string* error) {
   std::ifstream file(path, std::ios::binary);
-  std::string text{std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+  std::string text;
+  char chunk[4096];
+  // A read error (a folder, for one) sets the badbit.
+  while (file.read(chunk, sizeof chunk) || file.gcount() > 0) text.append(chunk, static_cast<size_t>(file.gcount()));
   if (!file.is_open() || file.bad()) {
     events_.clear();
     if (error) *error = "the events file \"" + path + "\" cannot be read";
