@@ -25,7 +25,6 @@ constexpr char kMeter[] = "Meter";
 constexpr char kLeftToRight[] = "LeftToRight";
 constexpr char kBitmap[] = "Bitmap";
 constexpr char kBitmapRefused[] = "Sorry, bitmap could not be loaded";
-constexpr int32_t kRefreshAll = 10000;
 
 // The settings of the group the core's Algorithm belongs to, in the host's profile file.
 class GroupSettings {

@@ -58,14 +58,11 @@ TEST_F(ProfileFileTest, WritesCrlfLinesReplacingOneKeyAndKeepingTheRest) {
 #endif
     EXPECT_FALSE(ProfileFile((dir / "no-folder" / "x.ini").string()).write("Colours", "Back1a", "1"));
     EXPECT_FALSE(ProfileFile("").write("Colours", "Back1a", "1"));
-}
-
-TEST_F(ProfileFileTest, RefusesNamesAndValuesThatWouldBreakTheFile) {
-    put("[Colours]\r\nBack1a=1\r\n");
+    const std::string before = bytes();  // nothing that would break the file's lines is written
     const char* refused[][3] = {{"Col]ours", "k", "v"}, {"Colours", "Back1a=x", "v"}, {"Colours", ";Back1a", "v"},
                                 {"Colours", "  ", "v"}, {"Colours", "Back1a", "2\r\n[Other]"}};
     for (const auto& r : refused) EXPECT_FALSE(file.write(r[0], r[1], r[2])) << r[0] << " " << r[1];
-    EXPECT_EQ(bytes(), "[Colours]\r\nBack1a=1\r\n");
+    EXPECT_EQ(bytes(), before);
 }
 
 // On Windows the file calls are the system's: the portable format must read what they write and the reverse.
