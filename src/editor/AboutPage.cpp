@@ -32,14 +32,14 @@ constexpr char kMaker[] = "The Ulvetta developers";
 
 }  // namespace
 
-AboutPage::AboutPage(EditorWindow* window, ReverbCore* core)
+AboutPage::AboutPage(Key, EditorWindow* window, ReverbCore* core)
     : SkinPanel(core, window), background_(kBackgroundPicture, kEditorRect) {
   font_.strip().loadResource(kLargeFontResource);
   font_.setGlyphs(kFontCharacterSet, kLargeFontWidths.data());
 }
 
 std::unique_ptr<AboutPage> AboutPage::create(EditorWindow* window, ReverbCore* core) {
-  std::unique_ptr<AboutPage> page(new AboutPage(window, core));
+  auto page = std::make_unique<AboutPage>(Key{}, window, core);
   const std::string names = std::string("\n\n") + kMaker;
   page->addCreditLine(std::string("Morvane Ulvetta Version ") + ULVETTA_VERSION, 0, 79, 15, 20);
   page->addCreditLine("SMP Optimized Digital Reverberation", 80, 159, 15, 20);

@@ -15,6 +15,9 @@
 namespace ulvetta {
 
 class AboutPage : public SkinPanel, public PushButtonTarget {
+  // Only create() can make the key, so every page is built there and registered in its slot.
+  struct Key {};
+
  public:
   // One text of the credit cycle, shown from tick first to tick last inclusive; lines end at character 10.
   struct CreditLine {
@@ -31,6 +34,7 @@ class AboutPage : public SkinPanel, public PushButtonTarget {
   // Builds the page with its credit lines and registers it in window's slot 2; the slot is emptied again
   // when the page is destroyed, so the window must outlive the page.
   static std::unique_ptr<AboutPage> create(EditorWindow* window, ReverbCore* core);
+  AboutPage(Key, EditorWindow* window, ReverbCore* core);
   ~AboutPage() override;
 
   // Appends a line; the cycle length becomes last when that is larger.
@@ -64,8 +68,6 @@ class AboutPage : public SkinPanel, public PushButtonTarget {
   void paintBackground(DibSurface* target) override;
 
  private:
-  AboutPage(EditorWindow* window, ReverbCore* core);
-
   SkinImage background_;
   BitmapFont font_;
   std::vector<CreditLine> lines_;

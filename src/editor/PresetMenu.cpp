@@ -1,5 +1,7 @@
 #include "editor/PresetMenu.h"
 
+#include <utility>
+
 #include "editor/Appearance.h"
 #include "editor/EditorWindow.h"
 #include "presets/PresetFile.h"
