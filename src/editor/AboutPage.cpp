@@ -9,9 +9,6 @@
 #ifndef ULVETTA_WEB_ADDRESS
 #define ULVETTA_WEB_ADDRESS ""
 #endif
-#ifndef ULVETTA_VERSION
-#define ULVETTA_VERSION ""
-#endif
 
 namespace ulvetta {
 
@@ -41,7 +38,7 @@ AboutPage::AboutPage(Key, EditorWindow* window, ReverbCore* core)
 std::unique_ptr<AboutPage> AboutPage::create(EditorWindow* window, ReverbCore* core) {
   auto page = std::make_unique<AboutPage>(Key{}, window, core);
   const std::string names = std::string("\n\n") + kMaker;
-  page->addCreditLine(std::string("Morvane Ulvetta Version ") + ULVETTA_VERSION, 0, 79, 15, 20);
+  page->addCreditLine("Morvane Ulvetta Version 1.0", 0, 79, 15, 20);
   page->addCreditLine("SMP Optimized Digital Reverberation", 80, 159, 15, 20);
   page->addCreditLine("Made by the Ulvetta developers\nfrom its own code and artwork", 160, 239, 15, 20);
   page->addCreditLine("Algorithm Development:" + names, 240, 319, 15, 20);
