@@ -16,6 +16,7 @@
 #include "ParamsReport.h"
 #include "Render.h"
 #include "SkinSheet.h"
+#include "Snapshot.h"
 #include "filter/ReverbCore.h"
 #include "presets/PresetFile.h"
 
@@ -121,6 +122,11 @@ int run(int argc, char** argv) {
     std::string skinOut;
     skin->add_option("OUT", skinOut, "The PNG file to write")->required();
 
+    // snapshot
+    auto* snapshot = app.add_subcommand("snapshot", "Draw a page of the editor, after scripted events, as OUT.png");
+    SnapshotCommand snapshotCommand;
+    snapshotCommand.attach(*snapshot);
+
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& e) {
@@ -172,6 +178,10 @@ int run(int argc, char** argv) {
 
     if (skin->parsed()) {
         writeSkinSheet(skinOut);
+        return kExitOk;
+    }
+    if (snapshot->parsed()) {
+        snapshotCommand.run(*snapshot);
         return kExitOk;
     }
 

@@ -40,7 +40,19 @@ constexpr int kModifierCtrl = 1;
 constexpr int kModifierShift = 2;
 
 // Virtual-key codes the editor handles.
+constexpr int kKeyBackspace = 8;
 constexpr int kKeyTab = 9;
+constexpr int kKeyEnter = 13;
+constexpr int kKeyEscape = 27;
+constexpr int kKeyPageUp = 33;
+constexpr int kKeyPageDown = 34;
+constexpr int kKeyEnd = 35;
+constexpr int kKeyHome = 36;
+constexpr int kKeyLeft = 37;
+constexpr int kKeyUp = 38;
+constexpr int kKeyRight = 39;
+constexpr int kKeyDown = 40;
+constexpr int kKeyDelete = 46;
 
 inline bool isPress(int event) {
   return event == kLeftPress || event == kRightPress || event == kLeftDoubleClick || event == kRightDoubleClick;

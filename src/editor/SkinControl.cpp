@@ -1,7 +1,9 @@
 #include "editor/SkinControl.h"
 
 #include <algorithm>
+#include <cstring>
 
+#include "editor/EditorPage.h"
 #include "editor/EditorWindow.h"
 
 namespace ulvetta {
@@ -17,10 +19,14 @@ void SkinControl::paint(int, int, int, int, int callerChildId) {
 bool SkinControl::mouse(int, int, int, int) { return false; }
 bool SkinControl::keyDown(int) { return false; }
 
+int SkinControl::frameFor(float position) const {
+  return std::clamp(static_cast<int>(static_cast<float>(frameCount_ - 1) * position + 0.5f), 0,
+                    std::max(frameCount_ - 1, 0));
+}
+
 void SkinControl::setFrame(float position) {
   if (!strip_ || frameCount_ <= 0) return;
-  drawFrame(std::clamp(static_cast<int>(static_cast<float>(frameCount_ - 1) * position + 0.5f), 0,
-                       frameCount_ - 1));
+  drawFrame(frameFor(position));
 }
 
 void SkinControl::drawFrame(int frame) {
@@ -58,6 +64,49 @@ DibSurface* SkinControl::surface() const {
 
 void SkinControl::present(int x, int y, int w, int h) const {
   if (parent_) parent_->present(x, y, w, h);
+}
+
+EditorRect SkinControl::clipTo(const EditorRect& area, int x, int y, int w, int h) {
+  if (x == -1 && y == -1 && w == -1 && h == -1) return area;
+  return intersectRect(area, {x, y, w, h});
+}
+
+void SkinControl::redraw(const EditorRect& r) {
+  if (!page_ || !surface() || emptyRect(r)) return;
+  page_->repaintRect(r.x, r.y, r.w, r.h, childId_);
+  paint(r.x, r.y, r.w, r.h, -1);
+  page_->redrawAbove(r.x, r.y, r.w, r.h, childId_);
+  present(r);
+}
+
+void SkinControl::saveArea(const EditorRect& area) {
+  DibSurface* s = surface();
+  savedArea_ = s ? intersectRect(area, {0, 0, s->width(), s->height()}) : EditorRect{};
+  if (emptyRect(savedArea_)) return;
+  const size_t row = static_cast<size_t>(savedArea_.w) * 4;
+  saved_.resize(row * savedArea_.h);
+  for (int j = 0; j < savedArea_.h; ++j)
+    std::memcpy(&saved_[row * j], s->at(savedArea_.x, savedArea_.y + j), row);
+}
+
+void SkinControl::restoreOutside(const EditorRect& area, const EditorRect& clip) {
+  DibSurface* s = surface();
+  if (!s || emptyRect(savedArea_) || !(intersectRect(area, savedArea_) == savedArea_)) return;
+  const EditorRect& a = savedArea_;
+  const EditorRect in = intersectRect(a, clip);
+  const size_t row = static_cast<size_t>(a.w) * 4;
+  for (int j = 0; j < a.h; ++j) {
+    const uint8_t* from = &saved_[row * j];
+    uint8_t* to = s->at(a.x, a.y + j);
+    const int y = a.y + j;
+    if (emptyRect(in) || y < in.y || y >= in.y + in.h) {
+      std::memcpy(to, from, row);
+      continue;
+    }
+    std::memcpy(to, from, static_cast<size_t>(in.x - a.x) * 4);
+    const int right = in.x + in.w - a.x;
+    std::memcpy(to + right * 4, from + right * 4, static_cast<size_t>(a.w - right) * 4);
+  }
 }
 
 EditorRect unionRect(const EditorRect& a, const EditorRect& b) {

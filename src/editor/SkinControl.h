@@ -2,6 +2,7 @@
 // The base of every control on an editor page: its rectangle in the back buffer, the parameter it shows, its
 // child id (the stacking order on its page), an optional strip of frames, its focus, capture and disabled
 // flags, and the links to the controls that redraw when it changes (a fader and its value display).
+#include <cstdint>
 #include <memory>
 #include <vector>
 
@@ -14,6 +15,12 @@ class DibSurface;
 class EditorPage;
 class EditorWindow;
 class ReverbCore;
+
+// The smallest rectangle holding both (an empty one gives the other).
+EditorRect unionRect(const EditorRect& a, const EditorRect& b);
+// The overlap of a and b; w or h 0 when they do not overlap.
+EditorRect intersectRect(const EditorRect& a, const EditorRect& b);
+inline bool emptyRect(const EditorRect& r) { return r.w <= 0 || r.h <= 0; }
 
 class SkinControl {
  public:
@@ -66,10 +73,26 @@ class SkinControl {
   // Copies (x, y, w, h) of the back buffer to the window.
   void present(int x, int y, int w, int h) const;
   void present(const EditorRect& r) const { present(r.x, r.y, r.w, r.h); }
+  // The strip frame that shows position: trunc((frames - 1) x position + 0.5), within the strip.
+  int frameFor(float position) const;
   // Draws strip frame number frame (kept as the current frame).
   void drawFrame(int frame);
   bool contains(int x, int y) const {
     return x >= rect_.x && y >= rect_.y && x < rect_.x + rect_.w && y < rect_.y + rect_.h;
+  }
+  // The part of area inside the paint clip (x, y, w, h); all -1 is the whole area.
+  static EditorRect clipTo(const EditorRect& area, int x, int y, int w, int h);
+  // Restores r from the page (background and the controls below), paints this control inside r, redraws
+  // the controls above and copies r to the window.
+  void redraw(const EditorRect& r);
+  // Runs draw, which may touch any pixel of area, and puts back every pixel of area outside clip: text and
+  // lines cannot clip themselves, and drawing twice over a pixel outside a restored rectangle darkens it.
+  template <class Draw>
+  void drawClipped(const EditorRect& area, const EditorRect& clip, Draw draw) {
+    const bool whole = intersectRect(area, clip) == area;
+    if (!whole) saveArea(area);
+    draw();
+    if (!whole) restoreOutside(area, clip);
   }
 
   EditorWindow* parent_;
@@ -88,13 +111,12 @@ class SkinControl {
   int z_ = -1;
 
  private:
-  std::vector<SkinControl*> links_;
-};
+  void saveArea(const EditorRect& area);
+  void restoreOutside(const EditorRect& area, const EditorRect& clip);
 
-// The smallest rectangle holding both (an empty one gives the other).
-EditorRect unionRect(const EditorRect& a, const EditorRect& b);
-// The overlap of a and b; w or h 0 when they do not overlap.
-EditorRect intersectRect(const EditorRect& a, const EditorRect& b);
-inline bool emptyRect(const EditorRect& r) { return r.w <= 0 || r.h <= 0; }
+  std::vector<SkinControl*> links_;
+  std::vector<uint8_t> saved_;  // pixels of the area drawClipped is drawing on, row by row
+  EditorRect savedArea_;
+};
 
 }  // namespace ulvetta

@@ -12,8 +12,6 @@ import sys
 
 from PIL import Image, ImageDraw, ImageFilter, ImageFont
 
-# What the about page's link opens: the user guide installed beside the module.
-LINK_TEXT = "README.html"
 PRODUCT = "Morvane Ulvetta"
 
 FONT_DIR = "/usr/share/fonts/truetype/dejavu"
@@ -368,12 +366,7 @@ def about_background():
         for y in (12, 154):
             d.ellipse([x - 4, y - 4, x + 4, y + 4], fill=(90, 94, 100), outline=PANEL_EDGE_LO)
             d.line([(x - 2, y), (x + 2, y)], fill=(30, 32, 36))
-    # The link area (570, 152, 180 x 15) shows what the link opens.
-    link = font(SANS, 10)
-    tw = link.getlength(LINK_TEXT)
-    x = round(570 + (180 - 12 - tw) / 2)
-    d.text((x, 153), LINK_TEXT, font=link, fill=AMBER)
-    d.line([(x, 165), (x + round(tw), 165)], fill=AMBER_DIM)
+    # The link area (570, 152, 180 x 15) stays plain: the page writes what the link opens there.
     bevel(img, hi=(80, 84, 90), lo=(10, 11, 12))
     return img
 
