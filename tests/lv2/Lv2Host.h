@@ -1,0 +1,208 @@
+// A small offline LV2 host on lilv: loads a plugin (from a bundle folder or the installed ones), connects
+// every port (controls to values, audio to block buffers, atom ports to empty sequences) and runs blocks.
+// Shared by the plugin's tests and the benchmark that compares it with other reverbs.
+#pragma once
+
+#include <lilv/lilv.h>
+#include <lv2/atom/atom.h>
+#include <lv2/state/state.h>
+#include <lv2/urid/urid.h>
+
+#include <cmath>
+#include <cstring>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace ulvetta::testing {
+
+// The URID map the host hands to plugins: URIs numbered from 1 in order of first use.
+class UridMap {
+ public:
+  UridMap() {
+    map_.handle = this;
+    map_.map = [](LV2_URID_Map_Handle h, const char* uri) { return static_cast<UridMap*>(h)->id(uri); };
+    unmap_.handle = this;
+    unmap_.unmap = [](LV2_URID_Unmap_Handle h, LV2_URID id) { return static_cast<UridMap*>(h)->uri(id); };
+    mapFeature_ = {LV2_URID__map, &map_};
+    unmapFeature_ = {LV2_URID__unmap, &unmap_};
+  }
+  LV2_URID id(const char* uri) {
+    auto it = ids_.find(uri);
+    if (it != ids_.end()) return it->second;
+    uris_.push_back(std::make_unique<std::string>(uri));
+    return ids_[uri] = static_cast<LV2_URID>(uris_.size());
+  }
+  const char* uri(LV2_URID id) const { return id >= 1 && id <= uris_.size() ? uris_[id - 1]->c_str() : nullptr; }
+  const LV2_Feature* const* features() const { return list_; }
+  LV2_URID_Map* map() { return &map_; }
+  LV2_URID_Unmap* unmap() { return &unmap_; }
+
+ private:
+  LV2_URID_Map map_{};
+  LV2_URID_Unmap unmap_{};
+  LV2_Feature mapFeature_{}, unmapFeature_{};
+  const LV2_Feature* list_[3] = {&mapFeature_, &unmapFeature_, nullptr};
+  std::map<std::string, LV2_URID> ids_;
+  std::vector<std::unique_ptr<std::string>> uris_;
+};
+
+class Lv2Host {
+ public:
+  static constexpr uint32_t kMaxBlock = 8192;
+
+  // bundle: a folder holding manifest.ttl (with a trailing slash or not), or empty for the installed plugins.
+  Lv2Host(const std::string& bundle, const std::string& uri, double rate) : world_(lilv_world_new()) {
+    if (bundle.empty()) {
+      lilv_world_load_all(world_);
+    } else {
+      lilv_world_load_specifications(world_);
+      lilv_world_load_plugin_classes(world_);
+      std::string folder = bundle.back() == '/' ? bundle : bundle + "/";
+      LilvNode* node = lilv_new_file_uri(world_, nullptr, folder.c_str());
+      lilv_world_load_bundle(world_, node);
+      lilv_node_free(node);
+    }
+    LilvNode* u = lilv_new_uri(world_, uri.c_str());
+    plugin_ = lilv_plugins_get_by_uri(lilv_world_get_all_plugins(world_), u);
+    lilv_node_free(u);
+    if (!plugin_) return;
+    instance_ = lilv_plugin_instantiate(plugin_, rate, urids_.features());
+    if (!instance_) return;
+    connectPorts();
+  }
+  ~Lv2Host() {
+    if (instance_) {
+      if (active_) lilv_instance_deactivate(instance_);
+      lilv_instance_free(instance_);
+    }
+    lilv_world_free(world_);
+  }
+  Lv2Host(const Lv2Host&) = delete;
+  Lv2Host& operator=(const Lv2Host&) = delete;
+
+  bool ok() const { return instance_ != nullptr; }
+  const LilvPlugin* plugin() const { return plugin_; }
+  LilvWorld* world() const { return world_; }
+  UridMap& urids() { return urids_; }
+
+  // The value of a control port by symbol; false for an unknown symbol.
+  bool setControl(const std::string& symbol, float value) {
+    auto it = controlBySymbol_.find(symbol);
+    if (it == controlBySymbol_.end()) return false;
+    controls_[it->second] = value;
+    return true;
+  }
+  float control(const std::string& symbol) const {
+    auto it = controlBySymbol_.find(symbol);
+    return it == controlBySymbol_.end() ? 0.0f : controls_[it->second];
+  }
+
+  void activate() {
+    if (!active_) lilv_instance_activate(instance_);
+    active_ = true;
+  }
+  void deactivate() {
+    if (active_) lilv_instance_deactivate(instance_);
+    active_ = false;
+  }
+
+  // Runs one block of frames (at most kMaxBlock) of planar stereo through the plugin.
+  void run(const float* inL, const float* inR, float* outL, float* outR, uint32_t frames) {
+    std::memcpy(audioIn_[0].data(), inL, frames * sizeof(float));
+    std::memcpy(audioIn_[audioIn_.size() > 1 ? 1 : 0].data(), inR, frames * sizeof(float));
+    resetAtoms();
+    lilv_instance_run(instance_, frames);
+    std::memcpy(outL, audioOut_[0].data(), frames * sizeof(float));
+    std::memcpy(outR, audioOut_[audioOut_.size() > 1 ? 1 : 0].data(), frames * sizeof(float));
+  }
+
+  // The plugin's state and the control values, as a session saves them; null on failure.
+  LilvState* saveState() {
+    return lilv_state_new_from_instance(plugin_, instance_, urids_.map(), nullptr, nullptr, nullptr, nullptr,
+                                        &Lv2Host::portValue, this, LV2_STATE_IS_POD | LV2_STATE_IS_PORTABLE,
+                                        nullptr);
+  }
+  void restoreState(const LilvState* state) {
+    lilv_state_restore(state, instance_, &Lv2Host::setPortValue, this, 0, nullptr);
+  }
+
+ private:
+  static const void* portValue(const char* symbol, void* self, uint32_t* size, uint32_t* type) {
+    auto* host = static_cast<Lv2Host*>(self);
+    auto it = host->controlBySymbol_.find(symbol);
+    if (it == host->controlBySymbol_.end()) return nullptr;
+    *size = sizeof(float);
+    *type = host->urids_.id(LV2_ATOM__Float);
+    return &host->controls_[it->second];
+  }
+  static void setPortValue(const char* symbol, void* self, const void* value, uint32_t size, uint32_t type) {
+    auto* host = static_cast<Lv2Host*>(self);
+    if (size == sizeof(float) && type == host->urids_.id(LV2_ATOM__Float))
+      host->setControl(symbol, *static_cast<const float*>(value));
+  }
+
+  void connectPorts() {
+    const uint32_t count = lilv_plugin_get_num_ports(plugin_);
+    controls_.assign(count, 0.0f);
+    std::vector<float> mins(count), maxs(count), defaults(count);
+    lilv_plugin_get_port_ranges_float(plugin_, mins.data(), maxs.data(), defaults.data());
+    LilvNode* input = lilv_new_uri(world_, LV2_CORE__InputPort);
+    LilvNode* audio = lilv_new_uri(world_, LV2_CORE__AudioPort);
+    LilvNode* control = lilv_new_uri(world_, LV2_CORE__ControlPort);
+    LilvNode* atom = lilv_new_uri(world_, LV2_ATOM__AtomPort);
+    audioIn_.reserve(count);
+    audioOut_.reserve(count);
+    atoms_.reserve(count);
+    for (uint32_t i = 0; i < count; ++i) {
+      const LilvPort* port = lilv_plugin_get_port_by_index(plugin_, i);
+      const bool in = lilv_port_is_a(plugin_, port, input);
+      if (lilv_port_is_a(plugin_, port, audio)) {
+        auto& list = in ? audioIn_ : audioOut_;
+        list.emplace_back(kMaxBlock, 0.0f);
+        lilv_instance_connect_port(instance_, i, list.back().data());
+      } else if (lilv_port_is_a(plugin_, port, control)) {
+        controls_[i] = std::isnan(defaults[i]) ? 0.0f : defaults[i];
+        controlBySymbol_[lilv_node_as_string(lilv_port_get_symbol(plugin_, port))] = i;
+        lilv_instance_connect_port(instance_, i, &controls_[i]);
+      } else if (lilv_port_is_a(plugin_, port, atom)) {
+        atoms_.push_back({in, std::vector<uint8_t>(8192, 0)});
+        lilv_instance_connect_port(instance_, i, atoms_.back().buffer.data());
+      } else {
+        lilv_instance_connect_port(instance_, i, nullptr);
+      }
+    }
+    for (LilvNode* n : {input, audio, control, atom}) lilv_node_free(n);
+    resetAtoms();
+  }
+
+  // Inputs hold an empty event sequence; outputs offer their whole buffer.
+  void resetAtoms() {
+    for (AtomBuffer& a : atoms_) {
+      auto* seq = reinterpret_cast<LV2_Atom_Sequence*>(a.buffer.data());
+      seq->atom.type = a.input ? urids_.id(LV2_ATOM__Sequence) : urids_.id(LV2_ATOM__Chunk);
+      seq->atom.size = a.input ? sizeof(LV2_Atom_Sequence_Body)
+                               : static_cast<uint32_t>(a.buffer.size() - sizeof(LV2_Atom));
+      seq->body.unit = 0;
+      seq->body.pad = 0;
+    }
+  }
+
+  struct AtomBuffer {
+    bool input;
+    std::vector<uint8_t> buffer;
+  };
+
+  LilvWorld* world_;
+  const LilvPlugin* plugin_ = nullptr;
+  LilvInstance* instance_ = nullptr;
+  UridMap urids_;
+  bool active_ = false;
+  std::vector<float> controls_;
+  std::map<std::string, uint32_t> controlBySymbol_;
+  std::vector<std::vector<float>> audioIn_, audioOut_;
+  std::vector<AtomBuffer> atoms_;
+};
+
+}  // namespace ulvetta::testing
