@@ -52,17 +52,19 @@ class Lv2Host {
  public:
   static constexpr uint32_t kMaxBlock = 8192;
 
-  // bundle: a folder holding manifest.ttl (with a trailing slash or not), or empty for the installed plugins.
-  Lv2Host(const std::string& bundle, const std::string& uri, double rate) : world_(lilv_world_new()) {
-    if (bundle.empty()) {
+  // bundles: folders holding manifest.ttl (with a trailing slash or not); none for the installed plugins.
+  Lv2Host(const std::vector<std::string>& bundles, const std::string& uri, double rate) : world_(lilv_world_new()) {
+    if (bundles.empty()) {
       lilv_world_load_all(world_);
     } else {
       lilv_world_load_specifications(world_);
       lilv_world_load_plugin_classes(world_);
-      std::string folder = bundle.back() == '/' ? bundle : bundle + "/";
-      LilvNode* node = lilv_new_file_uri(world_, nullptr, folder.c_str());
-      lilv_world_load_bundle(world_, node);
-      lilv_node_free(node);
+      for (const std::string& bundle : bundles) {
+        const std::string folder = bundle.back() == '/' ? bundle : bundle + "/";
+        LilvNode* node = lilv_new_file_uri(world_, nullptr, folder.c_str());
+        lilv_world_load_bundle(world_, node);
+        lilv_node_free(node);
+      }
     }
     LilvNode* u = lilv_new_uri(world_, uri.c_str());
     plugin_ = lilv_plugins_get_by_uri(lilv_world_get_all_plugins(world_), u);
@@ -126,6 +128,17 @@ class Lv2Host {
   }
   void restoreState(const LilvState* state) {
     lilv_state_restore(state, instance_, &Lv2Host::setPortValue, this, 0, nullptr);
+  }
+  // Applies a preset of the loaded bundles by its URI; false when there is no such preset.
+  bool applyPreset(const std::string& uri) {
+    LilvNode* node = lilv_new_uri(world_, uri.c_str());
+    lilv_world_load_resource(world_, node);
+    LilvState* state = lilv_state_new_from_world(world_, urids_.map(), node);
+    lilv_node_free(node);
+    if (!state) return false;
+    restoreState(state);
+    lilv_state_free(state);
+    return true;
   }
 
  private:

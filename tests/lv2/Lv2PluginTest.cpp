@@ -72,6 +72,18 @@ void setAlgorithmPorts(Lv2Host& host, int algorithm) {
 
 class Lv2PluginTest : public CliTest {
  protected:
+  // The frames of out that differ from the renderer's interleaved output, and the first of them.
+  static std::pair<long long, long long> mismatches(const Stereo& out, const Audio& expected) {
+    long long count = 0, first = -1;
+    for (long long i = 0; i < expected.frames(); ++i) {
+      if (out.left[i] != expected.floats[2 * i] || out.right[i] != expected.floats[2 * i + 1]) {
+        if (first < 0) first = i;
+        ++count;
+      }
+    }
+    return {count, first};
+  }
+
   // Writes the signal as a float WAV and renders it with ulvetta; returns the renderer's output.
   Audio render(const Stereo& in, int rate, const std::vector<std::string>& options) {
     std::vector<float> interleaved;
@@ -95,22 +107,39 @@ TEST_F(Lv2PluginTest, SoundsExactlyLikeTheRendererForEveryAlgorithmRateAndBlock)
         const Audio expected =
             render(in, rate, {"--algorithm", std::to_string(algorithm), "--block", std::to_string(block)});
         ASSERT_EQ(expected.channels, 2);
-        Lv2Host host(ULVETTA_LV2_BUNDLE, lv2::kPluginUri, rate);
+        Lv2Host host({ULVETTA_LV2_BUNDLE}, lv2::kPluginUri, rate);
         ASSERT_TRUE(host.ok());
         setAlgorithmPorts(host, algorithm);
         host.activate();
         const Stereo out = runPlugin(host, in, block, static_cast<size_t>(expected.frames()));
-        long long mismatches = 0, first = -1;
-        for (long long i = 0; i < expected.frames(); ++i) {
-          if (out.left[i] != expected.floats[2 * i] || out.right[i] != expected.floats[2 * i + 1]) {
-            if (first < 0) first = i;
-            ++mismatches;
-          }
-        }
-        EXPECT_EQ(mismatches, 0) << "first differing frame " << first << " of " << expected.frames();
+        const auto [count, first] = mismatches(out, expected);
+        EXPECT_EQ(count, 0) << "first differing frame " << first << " of " << expected.frames();
       }
     }
   }
+}
+
+// Settings edited as the renderer's --set edits them, saved as a user preset, exported as an LV2 preset and
+// applied by the host: the plugin sounds like the renderer given the preset file.
+TEST_F(Lv2PluginTest, AnExportedUserPresetSoundsLikeItsSettingsFile) {
+  const RunResult saved = run(sets({"presets", "--dir", "p", "save", "Dark Hall", "--algorithm", "5"},
+                                   {"Decay=80", "Notch Q=0.7", "Output Level Wet=-9.5", "Low Pass Freq=6500",
+                                    "Early Reflections=-Inf.", "Input Gain=-3.5"}));
+  ASSERT_EQ(saved.status, 0) << saved.err;
+  const RunResult exported = run({"presets", "--dir", "p", "export-lv2", "user.lv2"});
+  ASSERT_EQ(exported.status, 0) << exported.err;
+  EXPECT_EQ(exported.out, "1 preset written to user.lv2\n");
+
+  const int rate = 44100;
+  const Stereo in = testSignal(rate, 10000);
+  const Audio expected = render(in, rate, {"--state", "p/Dark Hall.stp", "--block", "500"});
+  Lv2Host host({ULVETTA_LV2_BUNDLE, (dir_ / "user.lv2").string()}, lv2::kPluginUri, rate);
+  ASSERT_TRUE(host.ok());
+  ASSERT_TRUE(host.applyPreset(std::string(lv2::kPluginUri) + ":user-preset:Dark%20Hall"));
+  EXPECT_EQ(host.control("decay"), 80.0f);
+  host.activate();
+  const auto [count, first] = mismatches(runPlugin(host, in, 500, static_cast<size_t>(expected.frames())), expected);
+  EXPECT_EQ(count, 0) << "first differing frame " << first << " of " << expected.frames();
 }
 
 TEST_F(Lv2PluginTest, ASavedSessionRestoresExactly) {
@@ -123,7 +152,7 @@ TEST_F(Lv2PluginTest, ASavedSessionRestoresExactly) {
     host.setControl("notch_q", 0.7f);
     host.setControl("low_pass", 6500.0f);
   };
-  Lv2Host original(ULVETTA_LV2_BUNDLE, lv2::kPluginUri, rate);
+  Lv2Host original({ULVETTA_LV2_BUNDLE}, lv2::kPluginUri, rate);
   ASSERT_TRUE(original.ok());
   configure(original);
   original.activate();
@@ -137,7 +166,7 @@ TEST_F(Lv2PluginTest, ASavedSessionRestoresExactly) {
   EXPECT_NE(std::string(text).find("urn:ulvetta:reverb#settings"), std::string::npos);
 
   // A new host starts from the defaults and gets the session back.
-  Lv2Host restored(ULVETTA_LV2_BUNDLE, lv2::kPluginUri, rate);
+  Lv2Host restored({ULVETTA_LV2_BUNDLE}, lv2::kPluginUri, rate);
   ASSERT_TRUE(restored.ok());
   LilvState* loaded = lilv_state_new_from_string(restored.world(), restored.urids().map(), text);
   lilv_free(text);
@@ -154,7 +183,7 @@ TEST_F(Lv2PluginTest, ASavedSessionRestoresExactly) {
 TEST_F(Lv2PluginTest, RingsOutAfterTheSignalAndStartsCleanAfterActivation) {
   const int rate = 44100;
   const Stereo in = testSignal(rate, rate / 5);  // 0.1 s of signal, 0.1 s of silence
-  Lv2Host host(ULVETTA_LV2_BUNDLE, lv2::kPluginUri, rate);
+  Lv2Host host({ULVETTA_LV2_BUNDLE}, lv2::kPluginUri, rate);
   ASSERT_TRUE(host.ok());
   setAlgorithmPorts(host, 0);
   host.activate();
