@@ -10,6 +10,7 @@
 #include <cmath>
 #include <cstdio>
 #include <cstring>
+#include <limits>
 #include <memory>
 #include <new>
 
@@ -30,6 +31,7 @@ class Plugin {
       chunkType_ = map->map(map->handle, LV2_ATOM__Chunk);
     }
     applied_.fill(kUnapplied);
+    seen_.fill(std::numeric_limits<float>::quiet_NaN());
   }
 
   void connect(uint32_t port, void* data) {
@@ -92,6 +94,7 @@ class Plugin {
     if (!core_->loadState(bytes, 88)) return LV2_STATE_ERR_UNKNOWN;
     // The record is now the truth; ports that still show other values are applied again at the next block.
     for (int32_t id = 0; id < kParamCount; ++id) applied_[id] = core_->getValue(id);
+    restored_ = true;
     return LV2_STATE_SUCCESS;
   }
 
@@ -113,6 +116,17 @@ class Plugin {
   // loads the algorithm's remembered values, so every other port is applied again after it), then the rest
   // in id order.
   void applyPorts() {
+    // Nothing to do in the common case: no port moved since the last block (readings compared bit for bit).
+    bool moved = false;
+    for (int32_t id = 0; id < kParamCount; ++id) {
+      const float* p = ports_[paramPort(id)];
+      if (p && std::memcmp(p, &seen_[id], sizeof(float)) != 0) {
+        seen_[id] = *p;
+        moved = true;
+      }
+    }
+    if (!moved && !restored_) return;
+    restored_ = false;
     char text[ReverbCore::kTextCapacity];
     if (const float* p = ports_[paramPort(kAlgorithm)]) {
       const int32_t steps = stepsOf(kAlgorithm, *p, text, sizeof text);
@@ -145,6 +159,8 @@ class Plugin {
   bool ran_ = false;
   std::array<float*, kPortCount> ports_{};
   std::array<int32_t, kParamCount> applied_{};
+  std::array<float, kParamCount> seen_{};  // the port readings of the last block
+  bool restored_ = false;                  // a state was loaded: compare every port with it
   LV2_URID settingsKey_ = 0;
   LV2_URID chunkType_ = 0;
   bool active_ = false;

@@ -5,8 +5,12 @@
 
 #include <lilv/lilv.h>
 #include <lv2/atom/atom.h>
+#include <lv2/buf-size/buf-size.h>
+#include <lv2/options/options.h>
+#include <lv2/parameters/parameters.h>
 #include <lv2/state/state.h>
 #include <lv2/urid/urid.h>
+#include <lv2/worker/worker.h>
 
 #include <cmath>
 #include <cstring>
@@ -25,8 +29,6 @@ class UridMap {
     map_.map = [](LV2_URID_Map_Handle h, const char* uri) { return static_cast<UridMap*>(h)->id(uri); };
     unmap_.handle = this;
     unmap_.unmap = [](LV2_URID_Unmap_Handle h, LV2_URID id) { return static_cast<UridMap*>(h)->uri(id); };
-    mapFeature_ = {LV2_URID__map, &map_};
-    unmapFeature_ = {LV2_URID__unmap, &unmap_};
   }
   LV2_URID id(const char* uri) {
     auto it = ids_.find(uri);
@@ -35,22 +37,19 @@ class UridMap {
     return ids_[uri] = static_cast<LV2_URID>(uris_.size());
   }
   const char* uri(LV2_URID id) const { return id >= 1 && id <= uris_.size() ? uris_[id - 1]->c_str() : nullptr; }
-  const LV2_Feature* const* features() const { return list_; }
   LV2_URID_Map* map() { return &map_; }
   LV2_URID_Unmap* unmap() { return &unmap_; }
 
  private:
   LV2_URID_Map map_{};
   LV2_URID_Unmap unmap_{};
-  LV2_Feature mapFeature_{}, unmapFeature_{};
-  const LV2_Feature* list_[3] = {&mapFeature_, &unmapFeature_, nullptr};
   std::map<std::string, LV2_URID> ids_;
   std::vector<std::unique_ptr<std::string>> uris_;
 };
 
 class Lv2Host {
  public:
-  static constexpr uint32_t kMaxBlock = 8192;
+  static constexpr int32_t kMaxBlock = 8192;
 
   // bundles: folders holding manifest.ttl (with a trailing slash or not); none for the installed plugins.
   Lv2Host(const std::vector<std::string>& bundles, const std::string& uri, double rate) : world_(lilv_world_new()) {
@@ -70,7 +69,23 @@ class Lv2Host {
     plugin_ = lilv_plugins_get_by_uri(lilv_world_get_all_plugins(world_), u);
     lilv_node_free(u);
     if (!plugin_) return;
-    instance_ = lilv_plugin_instantiate(plugin_, rate, urids_.features());
+    // The block-length options and the rate that plugins built with common frameworks insist on.
+    rate_ = static_cast<float>(rate);
+    const LV2_URID intType = urids_.id(LV2_ATOM__Int), floatType = urids_.id(LV2_ATOM__Float);
+    options_[0] = {LV2_OPTIONS_INSTANCE, 0, urids_.id(LV2_BUF_SIZE__minBlockLength), sizeof(int32_t), intType, &minBlock_};
+    options_[1] = {LV2_OPTIONS_INSTANCE, 0, urids_.id(LV2_BUF_SIZE__maxBlockLength), sizeof(int32_t), intType, &maxBlock_};
+    options_[2] = {LV2_OPTIONS_INSTANCE, 0, urids_.id(LV2_BUF_SIZE__nominalBlockLength), sizeof(int32_t), intType,
+                   &maxBlock_};
+    options_[3] = {LV2_OPTIONS_INSTANCE, 0, urids_.id(LV2_PARAMETERS__sampleRate), sizeof(float), floatType, &rate_};
+    options_[4] = {LV2_OPTIONS_INSTANCE, 0, 0, 0, 0, nullptr};
+    features_[0] = {LV2_URID__map, urids_.map()};
+    features_[1] = {LV2_URID__unmap, urids_.unmap()};
+    features_[2] = {LV2_OPTIONS__options, options_};
+    features_[3] = {LV2_BUF_SIZE__boundedBlockLength, nullptr};
+    schedule_ = {this, &Lv2Host::scheduleWork};
+    features_[4] = {LV2_WORKER__schedule, &schedule_};
+    for (int i = 0; i < 5; ++i) featureList_[i] = &features_[i];
+    instance_ = lilv_plugin_instantiate(plugin_, rate, featureList_);
     if (!instance_) return;
     connectPorts();
   }
@@ -116,6 +131,7 @@ class Lv2Host {
     std::memcpy(audioIn_[audioIn_.size() > 1 ? 1 : 0].data(), inR, frames * sizeof(float));
     resetAtoms();
     lilv_instance_run(instance_, frames);
+    deliverResponses();
     std::memcpy(outL, audioOut_[0].data(), frames * sizeof(float));
     std::memcpy(outR, audioOut_[audioOut_.size() > 1 ? 1 : 0].data(), frames * sizeof(float));
   }
@@ -142,6 +158,31 @@ class Lv2Host {
   }
 
  private:
+  // The worker runs at once on the calling thread; its responses reach the plugin after the block.
+  const LV2_Worker_Interface* worker() const {
+    return static_cast<const LV2_Worker_Interface*>(lilv_instance_get_extension_data(instance_, LV2_WORKER__interface));
+  }
+  static LV2_Worker_Status scheduleWork(LV2_Worker_Schedule_Handle self, uint32_t size, const void* data) {
+    auto* host = static_cast<Lv2Host*>(self);
+    const LV2_Worker_Interface* w = host->instance_ ? host->worker() : nullptr;
+    if (!w || !w->work) return LV2_WORKER_ERR_UNKNOWN;
+    return w->work(lilv_instance_get_handle(host->instance_), &Lv2Host::respond, host, size, data);
+  }
+  static LV2_Worker_Status respond(LV2_Worker_Respond_Handle self, uint32_t size, const void* data) {
+    const auto* bytes = static_cast<const uint8_t*>(data);
+    static_cast<Lv2Host*>(self)->responses_.emplace_back(bytes, bytes + size);
+    return LV2_WORKER_SUCCESS;
+  }
+  void deliverResponses() {
+    const LV2_Worker_Interface* w = worker();
+    if (!w) return;
+    for (const auto& r : responses_)
+      if (w->work_response)
+        w->work_response(lilv_instance_get_handle(instance_), static_cast<uint32_t>(r.size()), r.data());
+    responses_.clear();
+    if (w->end_run) w->end_run(lilv_instance_get_handle(instance_));
+  }
+
   static const void* portValue(const char* symbol, void* self, uint32_t* size, uint32_t* type) {
     auto* host = static_cast<Lv2Host*>(self);
     auto it = host->controlBySymbol_.find(symbol);
@@ -208,9 +249,16 @@ class Lv2Host {
   };
 
   LilvWorld* world_;
+  UridMap urids_;
+  int32_t minBlock_ = 1, maxBlock_ = kMaxBlock;
+  float rate_ = 0.0f;
+  LV2_Options_Option options_[5] = {};
+  LV2_Feature features_[5] = {};
+  const LV2_Feature* featureList_[6] = {};
+  LV2_Worker_Schedule schedule_{};
+  std::vector<std::vector<uint8_t>> responses_;
   const LilvPlugin* plugin_ = nullptr;
   LilvInstance* instance_ = nullptr;
-  UridMap urids_;
   bool active_ = false;
   std::vector<float> controls_;
   std::map<std::string, uint32_t> controlBySymbol_;
