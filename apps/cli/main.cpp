@@ -13,6 +13,7 @@
 #include "AudioInput.h"
 #include "CliSetup.h"
 #include "IrCommand.h"
+#include "Lv2Export.h"
 #include "ParamsReport.h"
 #include "Render.h"
 #include "SkinSheet.h"
@@ -105,7 +106,10 @@ int run(int argc, char** argv) {
     save->add_flag("--force", force, "Replace an existing preset without asking");
     auto* remove = presets->add_subcommand("delete", "Delete a preset");
     remove->add_option("NAME", name, "Preset name")->required();
-    for (CLI::App* sub : {list, factory, show, save, remove}) sub->fallthrough();
+    auto* exportLv2 = presets->add_subcommand("export-lv2", "Write the presets as an LV2 preset bundle for the plugin");
+    std::string bundle;
+    exportLv2->add_option("BUNDLE", bundle, "Bundle folder (default ~/.lv2/ulvetta-presets.lv2)")->type_name("DIR");
+    for (CLI::App* sub : {list, factory, show, save, remove, exportLv2}) sub->fallthrough();
 
     // ir
     auto* ir = app.add_subcommand(
@@ -190,6 +194,12 @@ int run(int argc, char** argv) {
         return kExitOk;
     }
     const PresetFolder folder(dir.empty() ? defaultPresetDirectory() : dir);
+    if (exportLv2->parsed()) {
+        const std::string target = bundle.empty() ? defaultLv2PresetBundle() : bundle;
+        const int count = exportLv2Presets(folder, target);
+        std::printf("%d preset%s written to %s\n", count, count == 1 ? "" : "s", target.c_str());
+        return kExitOk;
+    }
     if (list->parsed()) {
         std::vector<std::string> names = folder.list();
         std::sort(names.begin(), names.end());

@@ -119,6 +119,16 @@ void destroyTables(FftTables* t) {
     alignedFree(block);
 }
 
+// Frees the cached tables when the module is unloaded: a plug-in host may load and unload the module many
+// times, and each load would otherwise leave its tables behind. Every user of the tables (the engines and
+// their workers) is gone by then, so no lock is taken.
+struct CacheRelease {
+    ~CacheRelease() {
+        for (auto& slot : gSlots) destroyTables(slot.exchange(nullptr, std::memory_order_acq_rel));
+    }
+};
+CacheRelease gCacheRelease;
+
 }  // namespace
 
 const FftTables* acquireTables(int order) {
