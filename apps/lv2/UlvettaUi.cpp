@@ -64,12 +64,12 @@ class Ui {
  public:
   Ui(LV2UI_Write_Function write, LV2UI_Controller controller, unsigned long parent)
       : write_(write), controller_(controller), host_(parent, configFolder(), presetFolder()) {
-    sent_.fill(std::numeric_limits<int32_t>::min());
     if (!host_.ok()) return;
     pages_ = std::make_unique<PageSet>(core_, &host_);
     if (pages_->failed()) return;
     host_.show(&pages_->window());
-    for (int32_t id = 0; id < kParamCount; ++id) sent_[id] = core_.getValue(id);
+    // The ports start at their defaults, which the mirror holds.
+    for (int32_t id = 0; id < kParamCount; ++id) sent_[id] = shown_[id] = core_.getValue(id);
     lastTick_ = Clock::now();
   }
 
@@ -99,10 +99,11 @@ class Ui {
     sent_[id] = steps;
     if (core_.getValue(id) == steps) return;
     core_.setValue(id, steps);
-    // An algorithm switch loads that algorithm's remembered values; the ports still say what the plugin uses.
+    // The mirror's algorithm switch loads that algorithm's remembered values, but the plugin keeps what its
+    // ports say when the host changes the algorithm: so does the mirror.
     if (id == kAlgorithm)
       for (int32_t other = 0; other < kParamCount; ++other)
-        if (other != kAlgorithm && shown_[other] != kUnknown) core_.setValue(other, shown_[other]);
+        if (other != kAlgorithm) core_.setValue(other, shown_[other]);
     core_.notifyListeners(id);
   }
 
@@ -121,7 +122,6 @@ class Ui {
 
  private:
   using Clock = std::chrono::steady_clock;
-  static constexpr int32_t kUnknown = std::numeric_limits<int32_t>::min();
 
   void sendChanges() {
     // The algorithm first: the plugin applies the other ports again after switching.
@@ -143,12 +143,8 @@ class Ui {
   MirrorCore core_;
   X11Host host_;
   std::unique_ptr<PageSet> pages_;
-  std::array<int32_t, kParamCount> sent_{};
-  std::array<int32_t, kParamCount> shown_ = [] {
-    std::array<int32_t, kParamCount> a{};
-    a.fill(kUnknown);
-    return a;
-  }();
+  std::array<int32_t, kParamCount> sent_{};   // the values last written to or received from each port
+  std::array<int32_t, kParamCount> shown_{};  // what each port says the plugin uses
   Clock::time_point lastTick_{};
 };
 

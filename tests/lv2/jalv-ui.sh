@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # The plugin and its editor in jalv (GTK), as a user opens them, on a private X server (Xvfb, 24-bit) and a
-# private dummy JACK server: the editor's window must show exactly what `ulvetta snapshot` draws for the same
-# settings, and jalv must quit cleanly when asked to. With a third argument the jalv window is saved there.
+# private dummy JACK server, started on a factory preset: the editor's window must show exactly what `ulvetta
+# snapshot` draws for the same preset, and jalv must quit cleanly when asked to. With a third argument the jalv window is saved there.
 # Usage: jalv-ui.sh BUNDLE ULVETTA [PICTURE.png]
 set -euo pipefail
 bundle=$1
@@ -43,11 +43,12 @@ await jack_lsp || fail "the dummy JACK server did not start"
 
 # One tick, as the editor in jalv has long had: the load bar is drawn by the tick.
 echo "tick 1" >"$work/tick.events"
-"$ulvetta" snapshot --page reverb --events "$work/tick.events" "$work/expected.png" || fail "ulvetta snapshot failed"
+"$ulvetta" snapshot --page reverb --preset "classic plate" --events "$work/tick.events" "$work/expected.png" ||
+  fail "ulvetta snapshot failed"
 
 mkdir "$work/lv2"
 ln -s "$(realpath "$bundle")" "$work/lv2/ulvetta.lv2"
-LV2_PATH="$work/lv2" jalv.gtk3 urn:ulvetta:reverb >"$work/jalv.log" 2>&1 &
+LV2_PATH="$work/lv2" jalv.gtk3 -p urn:ulvetta:reverb:preset:classic-plate urn:ulvetta:reverb >"$work/jalv.log" 2>&1 &
 jalv=$!
 pids+=($jalv)
 
