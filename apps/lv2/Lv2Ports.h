@@ -10,6 +10,8 @@ namespace ulvetta::lv2 {
 
 // The plugin's identifier: a URN, so it names no web address.
 inline constexpr const char* kPluginUri = "urn:ulvetta:reverb";
+// The X11 user interface.
+inline constexpr const char* kUiUri = "urn:ulvetta:reverb#ui";
 // The state key of the 88-byte settings record.
 inline constexpr const char* kSettingsKey = "urn:ulvetta:reverb#settings";
 

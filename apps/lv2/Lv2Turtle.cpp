@@ -21,6 +21,7 @@ constexpr const char* kPrefixes =
     "@prefix rdf: <http://www.w3.org/1999/02/22-rdf-syntax-ns#> .\n"
     "@prefix rdfs: <http://www.w3.org/2000/01/rdf-schema#> .\n"
     "@prefix state: <http://lv2plug.in/ns/ext/state#> .\n"
+    "@prefix ui: <http://lv2plug.in/ns/extensions/ui#> .\n"
     "@prefix units: <http://lv2plug.in/ns/extensions/units#> .\n"
     "@prefix urid: <http://lv2plug.in/ns/ext/urid#> .\n\n";
 
@@ -137,10 +138,12 @@ std::string turtleString(const std::string& text) {
   return out + "\"";
 }
 
-std::string manifestTtl(const std::string& binary) {
+std::string manifestTtl(const std::string& binary, const std::string& uiBinary) {
   std::ostringstream out;
   out << kPrefixes << "<" << kPluginUri << ">\n    a lv2:Plugin ;\n    lv2:binary <" << binary
       << "> ;\n    rdfs:seeAlso <ulvetta.ttl> .\n";
+  if (!uiBinary.empty())
+    out << "\n<" << kUiUri << ">\n    a ui:X11UI ;\n    ui:binary <" << uiBinary << "> ;\n    rdfs:seeAlso <ulvetta.ttl> .\n";
   for (int a = 0; a < kAlgorithmCount; ++a)
     out << "\n<" << presetSlugUri(a) << ">\n    a pset:Preset ;\n    lv2:appliesTo <" << kPluginUri
         << "> ;\n    rdfs:seeAlso <presets.ttl> .\n";
@@ -157,6 +160,7 @@ std::string pluginTtl() {
       << "    lv2:optionalFeature lv2:hardRTCapable ;\n"
       << "    lv2:requiredFeature urid:map ;\n"
       << "    lv2:extensionData state:interface ;\n"
+      << "    ui:ui <" << kUiUri << "> ;\n"
       << "    lv2:port [\n";
   writeSimplePort(out, "lv2:InputPort , lv2:AudioPort", kInLeft, "in_left", "In Left", "");
   out << "    ] , [\n";
@@ -178,7 +182,18 @@ std::string pluginTtl() {
   out << "    ] , [\n";
   writeSimplePort(out, "lv2:OutputPort , lv2:ControlPort", kLatency, "latency", "Latency",
                   "    lv2:portProperty lv2:reportsLatency , lv2:integer ;\n    units:unit units:frame ;\n");
-  out << "    ] .\n";
+  out << "    ] .\n\n";
+  // The editor: a fixed-size X11 window, ticked by the host's idle calls, fed the meter by port events.
+  out << "<" << kUiUri << ">\n"
+      << "    a ui:X11UI ;\n"
+      << "    lv2:optionalFeature ui:parent , ui:resize , ui:noUserResize ;\n"
+      << "    lv2:requiredFeature ui:idleInterface ;\n"
+      << "    lv2:extensionData ui:idleInterface ;\n"
+      << "    ui:portNotification [\n"
+      << "        ui:plugin <" << kPluginUri << "> ;\n"
+      << "        lv2:symbol \"meter\" ;\n"
+      << "        ui:protocol ui:floatProtocol\n"
+      << "    ] .\n";
   return out.str();
 }
 

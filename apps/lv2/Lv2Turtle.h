@@ -26,9 +26,9 @@ std::string turtleNumber(double value);
 // A string literal with quotes, backslashes and control characters escaped.
 std::string turtleString(const std::string& text);
 
-// The plugin bundle: manifest.ttl (plugin and factory presets), the plugin description for binary, and the
-// factory presets' file.
-std::string manifestTtl(const std::string& binary);
+// The plugin bundle: manifest.ttl (the plugin in binary, its X11 user interface in uiBinary unless that is
+// empty, the factory presets), the plugin description, and the factory presets' file.
+std::string manifestTtl(const std::string& binary, const std::string& uiBinary);
 std::string pluginTtl();
 std::string factoryPresetsTtl();
 
