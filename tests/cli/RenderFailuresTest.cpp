@@ -106,8 +106,8 @@ TEST_F(RenderFailures, FullDiskAndUnwritableFolderLeaveNothing) {
         fs::create_directory(dir_ / "disk");
         // Inside the namespace: mount, render onto the small disk, then show what is left on it.
         const RunResult full = run({"render", "in.wav", "disk/keep.wav"},
-                                   "unshare -rm sh -c 'mount -t tmpfs -o size=128k tmpfs disk && echo old >disk/keep.wav"
-                                   " && \"$0\" \"$@\"; s=$?; ls -A disk; cat disk/keep.wav; exit $s'");
+                                   "unshare -rm sh -c 'mount -t tmpfs -o size=128k tmpfs disk && echo old"
+                                   " >disk/keep.wav && \"$0\" \"$@\"; s=$?; ls -A disk; cat disk/keep.wav; exit $s'");
         expectOneSentence(full, 1);
         EXPECT_EQ(full.out, "keep.wav\nold\n");
         fs::remove(dir_ / "disk");
