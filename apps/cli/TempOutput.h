@@ -9,7 +9,7 @@ namespace ulvetta {
 class TempOutput {
 public:
     // Creates the file (mode 0666 before the umask) with a random hidden name in target's folder.
-    // Throws CliError with the failure status when it cannot.
+    // Throws CliError with the bad-input status when it cannot (a missing or unwritable folder).
     explicit TempOutput(const std::filesystem::path& target);
     ~TempOutput();
     TempOutput(const TempOutput&) = delete;

@@ -1,5 +1,6 @@
 #include "presets/PresetFile.h"
 
+#include <algorithm>
 #include <cctype>
 #include <cstdio>
 #include <cstring>
@@ -56,6 +57,16 @@ bool isWindowsDeviceName(const std::string& name) {
         if (equalsIgnoringCase(stem, "COM") || equalsIgnoringCase(stem, "LPT")) return true;
     }
     return false;
+}
+
+// The suffix with upper-case letters where variant has bits (4: 'S', 2: 'T', 1: 'P'); variant 0 is
+// ".stp" itself, so the lower-case file comes first when several hold a record.
+constexpr int kSuffixVariants = 8;
+std::string suffixVariant(int variant) {
+    std::string s = kPresetSuffix;
+    for (int i = 1; i <= 3; ++i)
+        if (variant & (8 >> i)) s[i] = static_cast<char>(std::toupper(static_cast<unsigned char>(s[i])));
+    return s;
 }
 
 bool hasPresetSuffix(const std::string& fileName) {
@@ -142,8 +153,29 @@ std::string presetNameProblem(const std::string& name) {
 PresetFolder::PresetFolder(std::string directory, bool createOnSave)
     : directory_(std::move(directory)), createOnSave_(createOnSave) {}
 
+PresetResult PresetFolder::resolve(const std::string& name, std::string& path, StateBytes& out) const {
+    PresetResult first = PresetResult::NotFound;
+    for (int v = 0; v < kSuffixVariants; ++v) {
+        const fs::path candidate = fs::path(directory_) / (name + suffixVariant(v));
+        const PresetResult r = readRecord(candidate, out);
+        if (r == PresetResult::Ok) {
+            path = candidate.string();
+            return r;
+        }
+        if (r != PresetResult::NotFound && first == PresetResult::NotFound) {
+            first = r;
+            path = candidate.string();
+        }
+    }
+    if (first == PresetResult::NotFound) path = (fs::path(directory_) / (name + kPresetSuffix)).string();
+    return first;
+}
+
 std::string PresetFolder::pathOf(const std::string& name) const {
-    return (fs::path(directory_) / (name + kPresetSuffix)).string();
+    std::string path;
+    StateBytes unused;
+    resolve(name, path, unused);
+    return path;
 }
 
 std::vector<std::string> PresetFolder::list() const {
@@ -154,16 +186,18 @@ std::vector<std::string> PresetFolder::list() const {
         const std::string fileName = it->path().filename().string();
         if (!hasPresetSuffix(fileName)) continue;
         const std::string name = fileName.substr(0, fileName.size() - kSuffixLength);
-        if (!presetNameProblem(name).empty()) continue;
+        if (!presetNameProblem(name).empty() || std::find(names.begin(), names.end(), name) != names.end()) continue;
+        std::string path;
         StateBytes bytes;
-        if (readRecord(it->path(), bytes) == PresetResult::Ok) names.push_back(name);
+        if (resolve(name, path, bytes) == PresetResult::Ok) names.push_back(name);
     }
     return names;
 }
 
 PresetResult PresetFolder::read(const std::string& name, StateBytes& out) const {
     if (!presetNameProblem(name).empty()) return PresetResult::BadName;
-    return readRecord(pathOf(name), out);
+    std::string path;
+    return resolve(name, path, out);
 }
 
 PresetResult PresetFolder::load(const std::string& name, ReverbCore& core) const {
@@ -175,31 +209,36 @@ PresetResult PresetFolder::load(const std::string& name, ReverbCore& core) const
 
 PresetResult PresetFolder::save(const std::string& name, ReverbCore& core, OverwriteQuestion& ask) const {
     if (!presetNameProblem(name).empty()) return PresetResult::BadName;
-    const fs::path target = pathOf(name);
+    std::string path;
+    StateBytes bytes;
+    const PresetResult existing = resolve(name, path, bytes);
+    const fs::path target = path;
     std::error_code ec;
-    const fs::file_status st = fs::status(target, ec);
-    if (fs::exists(st)) {
-        if (fs::is_directory(st)) return PresetResult::IoError;
-        if (!ask.confirmOverwrite(name, target.string())) return PresetResult::Declined;
+    if (existing != PresetResult::NotFound) {
+        if (fs::is_directory(target, ec)) return PresetResult::IoError;
+        if (!ask.confirmOverwrite(name, path)) return PresetResult::Declined;
     } else if (!fs::is_directory(directory_, ec)) {
         if (!createOnSave_) return PresetResult::IoError;
         fs::create_directories(directory_, ec);
         if (ec) return PresetResult::IoError;
     }
-    StateBytes bytes;
     if (!core.saveState(bytes.data())) return PresetResult::IoError;
     return writeReplacing(target, bytes);
 }
 
 PresetResult PresetFolder::remove(const std::string& name) const {
     if (!presetNameProblem(name).empty()) return PresetResult::BadName;
-    const fs::path target = pathOf(name);
-    std::error_code ec;
-    const fs::file_status st = fs::symlink_status(target, ec);
-    if (st.type() == fs::file_type::not_found) return PresetResult::Ok;  // nothing to delete
-    if (st.type() != fs::file_type::regular && st.type() != fs::file_type::symlink) return PresetResult::IoError;
-    fs::remove(target, ec);
-    return ec ? PresetResult::IoError : PresetResult::Ok;
+    PresetResult result = PresetResult::Ok;  // also when there is nothing to delete
+    for (int v = 0; v < kSuffixVariants; ++v) {
+        const fs::path target = fs::path(directory_) / (name + suffixVariant(v));
+        std::error_code ec;
+        const fs::file_status st = fs::symlink_status(target, ec);
+        if (st.type() == fs::file_type::not_found) continue;
+        if (st.type() == fs::file_type::regular || st.type() == fs::file_type::symlink) fs::remove(target, ec);
+        if (ec || (st.type() != fs::file_type::regular && st.type() != fs::file_type::symlink))
+            result = PresetResult::IoError;
+    }
+    return result;
 }
 
 PresetResult readStateFile(const std::string& path, StateBytes& out) { return readRecord(path, out); }

@@ -23,7 +23,8 @@ using StateBytes = std::array<uint8_t, kCoreStateSize>;
 // Longest preset name accepted (the editor's entry field holds this many characters).
 constexpr size_t kMaxPresetNameLength = 64;
 
-// The file-name suffix of a preset, compared without regard to letter case when listing.
+// The file-name suffix of a preset, compared without regard to letter case everywhere: "x.STP" holds the
+// preset "x" for listing, loading, saving and deleting alike.
 extern const char* const kPresetSuffix;
 
 enum class PresetResult {
@@ -56,27 +57,35 @@ public:
     explicit PresetFolder(std::string directory, bool createOnSave = true);
 
     const std::string& directory() const { return directory_; }
-    // The file that holds name (name is not checked here).
+    // The file that holds name (name is not checked here). Of the files named name + ".stp" with the
+    // suffix in any letter case, the first in the order ".stp", ".stP", ".sTp", ... ".STP" that holds a
+    // valid record; when none does, the first that exists; when none exists, name + ".stp". Loading,
+    // saving and the error messages all use this file.
     std::string pathOf(const std::string& name) const;
 
-    // Names of the valid presets, in the order of the directory enumeration: regular files whose names end
-    // in ".stp" in any letter case, with a usable name, exactly 88 bytes long and holding a valid record.
-    // A file of any other size is skipped without being read. A missing folder lists nothing.
+    // Names of the valid presets, each once, in the order of the directory enumeration: files whose
+    // names end in ".stp" in any letter case, with a usable name, whose pathOf holds a valid record
+    // (a regular file exactly 88 bytes long; a file of any other size is skipped without being read).
+    // A missing folder lists nothing.
     std::vector<std::string> list() const;
 
     // Reads the record of name into out (checked by size first, then by format identifier).
     PresetResult read(const std::string& name, StateBytes& out) const;
     // Reads the record and loads it into the core (algorithm first, then the other values).
     PresetResult load(const std::string& name, ReverbCore& core) const;
-    // Writes the core's current record under name. An existing file is replaced only when ask agrees;
-    // the record goes to a temporary file beside the target, which is renamed over it when complete, so
+    // Writes the core's current record to pathOf(name). An existing file is replaced only when ask
+    // agrees; the record goes to a temporary file beside the target, which is renamed over it when complete, so
     // a failure leaves either the old file or none, never a partial one.
     PresetResult save(const std::string& name, ReverbCore& core, OverwriteQuestion& ask) const;
-    // Deletes the preset file of name. A missing file is nothing to delete (Ok); something else under
-    // that name, such as a directory, is left alone (IoError).
+    // Deletes every file named name + ".stp" with the suffix in any letter case, so that the name is
+    // no longer listed. A missing file is nothing to delete (Ok); something else under that name, such
+    // as a directory, is left alone (IoError).
     PresetResult remove(const std::string& name) const;
 
 private:
+    // The record of pathOf(name) and that path, without checking the name.
+    PresetResult resolve(const std::string& name, std::string& path, StateBytes& out) const;
+
     std::string directory_;
     bool createOnSave_;
 };

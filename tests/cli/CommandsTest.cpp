@@ -70,6 +70,13 @@ TEST_F(CliTest, PresetCommandsManageTheFolder) {
     ASSERT_EQ(cmd({"save", "Hall A", "--algorithm", "3", "--force"}).status, 0);
     EXPECT_NE(slurp(dir_ / "Presets" / "Hall A.stp"), before);
 
+    // A preset whose suffix is upper case is the same preset to every command.
+    fs::rename(dir_ / "Presets" / "Plate.stp", dir_ / "Presets" / "Plate.STP");
+    EXPECT_EQ(cmd({"list"}).out, "Hall A\nPlate\n");
+    EXPECT_EQ(cmd({"show", "Plate"}).status, 0);
+    expectOneSentence(cmd({"save", "Plate"}), 2);
+    ASSERT_EQ(cmd({"save", "Plate", "--force"}).status, 0);
+    EXPECT_EQ(cmd({"list"}).out, "Hall A\nPlate\n");
     ASSERT_EQ(cmd({"delete", "Plate"}).status, 0);
     for (const char* command : {"delete", "show"}) expectOneSentence(cmd({command, "Plate"}), 2);
     for (const char* bad : {"../x", "..\\..\\x", "a:b", "what?", "st*r"})

@@ -92,9 +92,7 @@ TEST(Streaming, PausingWithNoInputEndsTheStreamDownstreamWithoutHoldingTheStateL
 TEST(Streaming, StateChangesConnectionsAndTheOfferedType) {
     Rig rig(44100, 4096);
     ASSERT_EQ(rig.Connect(), S_OK);
-    EXPECT_EQ(rig.filter->GetPin(0)->Disconnect(), VFW_E_NOT_STOPPED);
     EXPECT_EQ(rig.filter->Stop(), S_OK);
-    EXPECT_EQ(rig.Send(Ramp(16), 0, false), VFW_E_WRONG_STATE);
     // Another input format while the output is connected needs the output reconnected, which only a
     // graph can do.
     ASSERT_EQ(rig.filter->GetPin(0)->Disconnect(), S_OK);

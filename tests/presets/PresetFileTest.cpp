@@ -80,6 +80,40 @@ TEST_F(PresetFolderTest, ListsOnlyRegularFilesHoldingOneValidRecord) {
     EXPECT_EQ(folder_.load("Huge", core_), PresetResult::Invalid);
 }
 
+// A suffix in any letter case holds the preset for every operation. Where several files hold one name,
+// the name is listed once and the first valid one in the order .stp, .stP, ... .STP is the preset.
+TEST_F(PresetFolderTest, SuffixCaseIsMatchedAlikeEverywhere) {
+    writeBytes(dir_ / "Hall.STP", handRecord(40));
+    writeBytes(dir_ / "x.STP", handRecord(41));
+    writeBytes(dir_ / "x.stp", Bytes());
+    writeBytes(dir_ / "y.Stp", handRecord(42));
+    writeBytes(dir_ / "y.stp", handRecord(43));
+    writeBytes(dir_ / "z.sTp", Bytes(88, 0));
+    Names listed = folder_.list();
+    std::sort(listed.begin(), listed.end());
+    EXPECT_EQ(listed, (Names{"Hall", "x", "y"}));
+    for (const auto& [name, diffusion] : {std::pair{"Hall", 40}, {"x", 41}, {"y", 43}}) {
+        ASSERT_EQ(folder_.load(name, core_), PresetResult::Ok) << name;
+        EXPECT_EQ(core_.getValue(kDiffusion), diffusion) << name;
+    }
+    EXPECT_EQ(folder_.pathOf("Hall"), (dir_ / "Hall.STP").string());
+    EXPECT_EQ(folder_.pathOf("z"), (dir_ / "z.sTp").string()) << "an invalid file is still the one reported";
+    EXPECT_EQ(folder_.load("z", core_), PresetResult::Invalid);
+
+    // Saving asks about the file that holds the name and replaces that one.
+    Answer no(false), yes(true);
+    core_.setValue(kDiffusion, 77);
+    EXPECT_EQ(folder_.save("Hall", core_, no), PresetResult::Declined);
+    ASSERT_EQ(folder_.save("Hall", core_, yes), PresetResult::Ok);
+    EXPECT_EQ(bytesOf(dir_ / "Hall.STP")[20], 77);
+    EXPECT_EQ(no.asked + yes.asked, 2);
+
+    // Deleting a name removes every file of it, valid or not, so it is listed no more.
+    for (const char* name : {"Hall", "x", "z"}) EXPECT_EQ(folder_.remove(name), PresetResult::Ok) << name;
+    EXPECT_EQ(folder_.list(), Names{"y"});
+    EXPECT_EQ(entries(), (Names{"Presets", "Presets/y.Stp", "Presets/y.stp"}));
+}
+
 TEST_F(PresetFolderTest, NamesThatLeaveTheFolderOrBreakWindowsAreRefused) {
     writeBytes(root_ / "x.stp", handRecord(40));  // what the escaping names would reach
     Answer yes(true);

@@ -40,10 +40,14 @@ public:
         });
     }
     STDMETHODIMP LockServer(BOOL lock) override {
-        if (lock)
+        if (lock) {
             ++g_lockCount;
-        else
-            --g_lockCount;
+        } else {
+            // An unbalanced unlock must not let the count go negative and the module unload while in use.
+            long n = g_lockCount.load();
+            while (n > 0 && !g_lockCount.compare_exchange_weak(n, n - 1)) {
+            }
+        }
         return S_OK;
     }
 

@@ -76,7 +76,10 @@ STDMETHODIMP TransformInputPin::EndOfStream() {
 
 STDMETHODIMP TransformInputPin::BeginFlush() {
     return ComBoundary([&]() -> HRESULT {
-        // No lock: a streaming thread blocked downstream is released by the flush that follows.
+        // No lock: a streaming thread blocked downstream is released by the flush that follows. Without
+        // both connections there is nothing to flush, and a flag left set would drop the first samples.
+        TransformOutputPin* out = filter_->OutputPin();
+        if (!IsConnected() || out == nullptr || !out->IsConnected()) return VFW_E_NOT_CONNECTED;
         flushing_ = true;
         return filter_->BeginFlush();
     });

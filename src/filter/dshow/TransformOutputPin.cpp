@@ -185,10 +185,12 @@ HRESULT TransformOutputPin::UpstreamSeeking(IMediaSeeking** seeking) {
     return up->QueryInterface(IID_IMediaSeeking, reinterpret_cast<void**>(seeking));
 }
 
-#define ULVETTA_FORWARD_SEEKING(call)                       \
-    ComRef<IMediaSeeking> up;                               \
-    HRESULT hr = UpstreamSeeking(up.put());                 \
-    if (FAILED(hr) || !up) return FAILED(hr) ? hr : E_NOTIMPL; \
+// An upstream pin that cannot seek makes seeking unsupported here too (E_NOTIMPL, not its E_NOINTERFACE).
+#define ULVETTA_FORWARD_SEEKING(call)                                   \
+    ComRef<IMediaSeeking> up;                                           \
+    const HRESULT hr = UpstreamSeeking(up.put());                       \
+    if (hr == VFW_E_NOT_CONNECTED) return hr;                           \
+    if (FAILED(hr) || !up) return E_NOTIMPL;                            \
     return up->call
 
 STDMETHODIMP TransformOutputPin::GetCapabilities(DWORD* caps) { ULVETTA_FORWARD_SEEKING(GetCapabilities(caps)); }

@@ -35,8 +35,16 @@ public:
         return n == count ? S_OK : S_FALSE;
     }
     STDMETHODIMP Skip(ULONG count) override {
-        pos_ += count;
-        return S_OK;
+        return ComBoundary([&]() -> HRESULT {
+            ULONG skipped = 0;
+            AM_MEDIA_TYPE mt{};
+            while (skipped < count && pin_->GetMediaType(static_cast<int>(pos_), &mt) == S_OK) {
+                FreeMediaType(mt);
+                ++pos_;
+                ++skipped;
+            }
+            return skipped == count ? S_OK : S_FALSE;
+        });
     }
     STDMETHODIMP Reset() override {
         pos_ = 0;
