@@ -13,6 +13,7 @@
 #include "editor/headless/EventScript.h"
 #include "editor/headless/HeadlessHost.h"
 #include "filter/ReverbCore.h"
+#include "platform/ProfileFile.h"
 
 namespace ulvetta {
 namespace {
@@ -36,6 +37,7 @@ uint32_t pictureAt(int resource, int x, int y) {
 class WorkingPagesTest : public ::testing::Test {
  protected:
   void SetUp() override {
+    ASSERT_FALSE(pages.failed());
     host.show(&pages.window());
     host.settle();
   }
@@ -139,6 +141,8 @@ TEST_F(WorkingPagesTest, RightPressOpensTheMenuAndItsColourChoiceRepaintsThePage
     EXPECT_TRUE(withProfile.menus()[0].x == 325 && withProfile.menus()[0].y == 60);
     EXPECT_EQ(rgbOf(set.window().surface()->at(0, 100)), 0xC86432u);
   }
+  // 200 + 100 x 256 + 50 x 65536
+  EXPECT_EQ(ProfileFile((dir / "Ulvetta.ini").string()).read("Colours", "Back1a"), "3302600");
   EXPECT_EQ(core.getValue(kDecay), decay);
   std::filesystem::remove_all(dir);
 }
