@@ -90,9 +90,7 @@ TEST(BitmapResources, MasksCoverTheirPictures) {
     const std::pair<int, int> pairs[] = {{186, 188}, {187, 189}, {231, 230}, {178, 179}};
     for (auto [pictureId, maskId] : pairs) {
         const Picture picture = load(pictureId), mask = load(maskId);
-        ASSERT_EQ(mask.bits, 8) << maskId;
-        EXPECT_EQ(mask.width, picture.width) << maskId;
-        EXPECT_EQ(mask.height, picture.height) << maskId;
+        ASSERT_TRUE(mask.bits == 8 && mask.width == picture.width && mask.height == picture.height) << maskId;
         int opaque = 0;
         for (int y = 0; y < mask.height; ++y)
             for (int x = 0; x < mask.width; ++x) opaque += mask.grey(x, y) == 255;
