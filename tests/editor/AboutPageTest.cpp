@@ -7,16 +7,9 @@
 namespace ulvetta {
 namespace {
 
-class LinkHost : public test::RecordingHost {
- public:
-  std::string moduleFolder() override { return "/opt/ulvetta/"; }
-  void openDocument(const std::string& target) override { opened.push_back(target); }
-  std::vector<std::string> opened;
-};
-
 struct AboutPageTest : ::testing::Test {
   AboutPageTest() {
-    rig.window.attach(&host);
+    rig.host.folder = "/opt/ulvetta/";
     font.strip().loadResource(kLargeFontResource);
     font.setGlyphs(kFontCharacterSet, kLargeFontWidths.data());
     picture.draw(&reference);
@@ -25,13 +18,7 @@ struct AboutPageTest : ::testing::Test {
   void ticks(int n) {
     while (n-- > 0) rig.window.tick();
   }
-  // The pixels of r that differ between the back buffer and the reference.
-  int differences(const EditorRect& r) {
-    int n = 0;
-    for (int y = r.y; y < r.y + r.h; ++y)
-      for (int x = r.x; x < r.x + r.w; ++x) n += std::memcmp(rig.window.surface()->at(x, y), reference.at(x, y), 3) != 0;
-    return n;
-  }
+  int differences(const EditorRect& r) { return rig.differences(reference, r); }
   // The panel of text at opacity 1: the text's box centred in the credit area, 6 pixels around it.
   EditorRect opaquePanel(const std::string& text) {
     const int tw = font.textWidth(text), th = font.textHeight(text);
@@ -43,7 +30,7 @@ struct AboutPageTest : ::testing::Test {
   }
 
   test::EditorRig rig;
-  LinkHost host;
+  test::RecordingHost& host = rig.host;
   std::unique_ptr<AboutPage> page = AboutPage::create(&rig.window, &rig.core);
   BitmapFont font;
   SkinImage picture{196, kEditorRect};

@@ -1,8 +1,6 @@
 // Appearance settings and the preset menu against real files in a folder of their own: gradient pixels
 // derived by hand from the default colours, the menu actions' writes, pictures refused, copied and kept.
 #include <filesystem>
-#include <fstream>
-#include <optional>
 #include <random>
 
 #include "editor/Appearance.h"
@@ -17,34 +15,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// Answers the choosers and the menu from the test and records what was asked.
-struct ScriptedHost : test::RecordingHost {
-  std::string profilePath() override { return profile; }
-  std::string moduleFolder() override { return folder; }
-  std::string presetFolder() override { return folder + "Presets/"; }
-  bool chooseColour(SkinColour initial, SkinColour* chosen) override {
-    asked.push_back(initial);
-    if (colour) *chosen = *colour;
-    return colour.has_value();
-  }
-  bool chooseBitmapFile(const std::string&, std::string* chosen) override { return !(*chosen = file).empty(); }
-  void messageBox(const std::string& text) override { messages.push_back(text); }
-  int trackMenu(const std::vector<MenuItem>& items, int, int) override {
-    menu = items;
-    return answer;
-  }
-  void runPresetDialog(bool save, ReverbCore&, const std::string& where) override {
-    dialogs.push_back((save ? "save " : "load ") + where);
-  }
-
-  std::string profile, folder, file;
-  std::optional<SkinColour> colour;
-  int answer = 0;
-  std::vector<SkinColour> asked;
-  std::vector<std::string> messages, dialogs;
-  std::vector<MenuItem> menu;
-};
-
 uint32_t rgbOf(SkinColour c) { return c.r << 16 | c.g << 8 | c.b; }
 
 struct AppearanceTest : ::testing::Test {
@@ -53,7 +23,6 @@ struct AppearanceTest : ::testing::Test {
     fs::create_directories(dir / "module");
     host.folder = (dir / "module").string() + "/";
     host.profile = host.folder + "Ulvetta.ini";
-    rig.window.attach(&host);
   }
   ~AppearanceTest() override { fs::remove_all(dir); }
 
@@ -62,16 +31,10 @@ struct AppearanceTest : ::testing::Test {
     ProfileFile(host.profile).write(kAppearanceSection, key, value);
   }
   // A 24-bit picture of one colour, 750 pixels wide.
-  std::string picture(const fs::path& path, int height, uint32_t rgb) {
-    test::BmpLayout layout;
-    layout.width = kEditorWidth;
-    layout.height = height;
-    layout.bits = 24;
-    layout.colours = 0;
-    layout.pixel = [rgb](int, int, int channel) { return static_cast<uint8_t>(rgb >> (8 * channel)); };
-    const std::vector<uint8_t> bytes = test::makeFile(layout);
-    std::ofstream(path, std::ios::binary).write(reinterpret_cast<const char*>(bytes.data()), bytes.size());
-    return path.string();
+  static std::string picture(const fs::path& path, int height, uint32_t rgb) {
+    return test::writeFile(path.string(), test::colourBitmap(kEditorWidth, height, [rgb](int, int, int channel) {
+                             return static_cast<uint8_t>(rgb >> (8 * channel));
+                           }));
   }
   // The background drawn from the settings loaded now: R, G, B of (x, y).
   uint32_t drawn(int x, int y, AppearanceSet* loaded = nullptr) {
@@ -83,7 +46,7 @@ struct AppearanceTest : ::testing::Test {
   }
 
   test::EditorRig rig;
-  ScriptedHost host;
+  test::RecordingHost& host = rig.host;
   const fs::path dir = fs::temp_directory_path() / ("ulvetta-appearance-" + std::to_string(std::random_device()()));
 };
 
@@ -115,7 +78,6 @@ TEST_F(AppearanceTest, StoredColoursAreSigned32BitDecimalsOfRgb) {
       {"2299667", 0x131723}, {" \t+2299667 trailing", 0x131723}, {"-1", 0xFFFFFF}, {"none", 0},
       {"16777216", 0},       {"99999999999", 0xFFFFFF},         {"-99999999999", 0}};
   for (const auto& [text, rgb] : cases) EXPECT_EQ(rgbOf(parseColour(text)), rgb) << text;
-  EXPECT_EQ(colourText({19, 23, 35, 255}), "2299667");
 }
 
 TEST_F(AppearanceTest, MenuActionsWriteTheCurrentGroupOnlyWithAProfileFile) {

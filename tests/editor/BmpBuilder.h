@@ -2,7 +2,9 @@
 // Hand-made bitmaps for the editor's tests and benchmark: the bytes of a DIB (header, palette, rows), of a
 // whole BMP file, or a SkinBitmap loaded from them.
 #include <cstdint>
+#include <fstream>
 #include <functional>
+#include <string>
 #include <vector>
 
 #include "editor/SkinBitmap.h"
@@ -66,6 +68,22 @@ inline BmpLayout greyBitmap(int width, int height, std::function<uint8_t(int, in
   s.height = height;
   s.pixel = [level](int x, int y, int) { return level(x, y); };
   return s;
+}
+
+// A 24-bit picture without palette: channel c (B, G, R) of pixel (x, y) is pixel(x, y, c).
+inline BmpLayout colourBitmap(int width, int height, std::function<uint8_t(int, int, int)> pixel) {
+  BmpLayout s = greyBitmap(width, height, nullptr);
+  s.bits = 24;
+  s.colours = 0;
+  s.pixel = std::move(pixel);
+  return s;
+}
+
+// Writes layout as a BMP file and returns its path.
+inline std::string writeFile(const std::string& path, const BmpLayout& layout) {
+  const std::vector<uint8_t> bytes = makeFile(layout);
+  std::ofstream(path, std::ios::binary).write(reinterpret_cast<const char*>(bytes.data()), bytes.size());
+  return path;
 }
 
 // Loads layout's DIB into bitmap; false when the loader refuses it.

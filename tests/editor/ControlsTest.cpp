@@ -42,7 +42,7 @@ struct ControlsTest : ::testing::Test {
   SkinImage horizontalThumb{187, {0, 0, 15, 22}, SkinImage::kMasked, 189};
 };
 
-TEST_F(ControlsTest, FaderJumpsUnderThePointerAndDragsToTheTop) {
+TEST_F(ControlsTest, FaderJumpsUnderThePointerDragsToTheTopAndMovesAHundredthFinely) {
   fader(kDecay, 314, 39);
   rig.show();
   // Decay 47 puts the thumb at 39 + trunc(95 x 0.53 + 0.5) = 89. The pointer at y 60 is 14 pixels below the
@@ -57,11 +57,7 @@ TEST_F(ControlsTest, FaderJumpsUnderThePointerAndDragsToTheTop) {
   rig.mouse(kLeftRelease, 325, 0);
   rig.mouse(kLeftDrag, 325, 120);  // no longer captured
   EXPECT_EQ(rig.core.getValue(kDecay), 100);
-}
-
-TEST_F(ControlsTest, FineDragAcrossTheTrackMovesAHundredth) {
-  fader(kDecay, 314, 39);
-  rig.show();
+  // With Ctrl or Shift a press does not jump and a drag across the whole track moves one hundredth.
   for (int modifier : {kModifierCtrl, kModifierShift}) {
     rig.core.setValue(kDecay, 47);
     rig.core.notified.clear();

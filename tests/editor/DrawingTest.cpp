@@ -74,12 +74,10 @@ TEST(TintTest, GreyLevelsWeightTheColourAtSeveralAlphas) {
     for (int x = 0; x < 3; ++x) EXPECT_EQ(s.at(x, 0)[0], k.expected[x]) << k.alpha << " " << x;
   }
   // A 24-bit mask reads its middle byte and weighs trunc(g x alpha / 255): 255 of 256 at full alpha.
-  test::BmpLayout layout;
-  layout.bits = 24;
-  layout.colours = 0;
-  layout.pixel = [](int, int, int ch) { return uint8_t(ch == 1 ? 255 : 0); };
+  const SkinBitmap green =
+      loaded(test::colourBitmap(2, 2, [](int, int, int ch) { return uint8_t(ch == 1 ? 255 : 0); }));
   DibSurface s = greySurface(2, 2, 0);
-  loaded(layout).tintedCopyAlpha(&s, 0, 0, 2, 2, 0, 0, tint, 255);
+  green.tintedCopyAlpha(&s, 0, 0, 2, 2, 0, 0, tint, 255);
   EXPECT_EQ(s.at(1, 1)[0], 199);
 }
 

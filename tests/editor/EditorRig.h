@@ -1,12 +1,13 @@
 #pragma once
-// A small editor for control tests: a real core whose meter figures the test sets and whose notifyHost
-// positions it records, the editor window on a page with a plain background, and a host that records every
-// rectangle copied to the window.
+// A small editor for the editor's tests: a real core whose meter figures the test sets and whose notifyHost
+// positions it records, the editor window on a page with a plain background, and a recording host.
 #include <gtest/gtest.h>
 
 #include <cstring>
 #include <memory>
+#include <optional>
 #include <ostream>
+#include <string>
 #include <vector>
 
 #include "editor/BitmapFont.h"
@@ -23,25 +24,40 @@ inline void PrintTo(const EditorRect& r, std::ostream* os) { *os << r.x << ", " 
 
 namespace test {
 
+// Records what the editor copies, shows, asks and opens, and answers the choosers and the menu from its fields.
 class RecordingHost : public WindowHost {
  public:
   void present(const DibSurface&, int x, int y, int w, int h) override { presented.push_back({x, y, w, h}); }
   void invalidate() override {}
   void setCapture() override {}
   void releaseCapture() override {}
-  int caretBlinkTime() override { return blinkMilliseconds; }
-  void messageBox(const std::string&) override {}
-  void openDocument(const std::string&) override {}
-  bool chooseColour(SkinColour, SkinColour*) override { return false; }
-  bool chooseBitmapFile(const std::string&, std::string*) override { return false; }
-  int trackMenu(const std::vector<MenuItem>&, int, int) override { return 0; }
-  void runPresetDialog(bool, ReverbCore&, const std::string&) override {}
-  std::string profilePath() override { return {}; }
-  std::string moduleFolder() override { return {}; }
-  std::string presetFolder() override { return {}; }
+  int caretBlinkTime() override { return 500; }
+  void messageBox(const std::string& text) override { messages.push_back(text); }
+  void openDocument(const std::string& target) override { opened.push_back(target); }
+  bool chooseColour(SkinColour initial, SkinColour* chosen) override {
+    asked.push_back(initial);
+    if (colour) *chosen = *colour;
+    return colour.has_value();
+  }
+  bool chooseBitmapFile(const std::string&, std::string* chosen) override { return !(*chosen = file).empty(); }
+  int trackMenu(const std::vector<MenuItem>& items, int, int) override {
+    menu = items;
+    return answer;
+  }
+  void runPresetDialog(bool save, ReverbCore&, const std::string& where) override {
+    dialogs.push_back((save ? "save " : "load ") + where);
+  }
+  std::string profilePath() override { return profile; }
+  std::string moduleFolder() override { return folder; }
+  std::string presetFolder() override { return folder + "Presets/"; }
 
   std::vector<EditorRect> presented;
-  int blinkMilliseconds = 500;
+  std::string profile, folder, file;  // the profile file, the module's folder, the picture chosen
+  std::optional<SkinColour> colour;   // the colour chosen; none: the chooser is cancelled
+  int answer = 0;                     // the menu command chosen
+  std::vector<SkinColour> asked;      // the starting colour of every chooser shown
+  std::vector<std::string> messages, opened, dialogs;
+  std::vector<MenuItem> menu;
 };
 
 class TestCore : public ReverbCore {
@@ -112,11 +128,11 @@ struct EditorRig {
     fillRect(&s, 0, 0, kEditorWidth, kEditorHeight, PlainPage::kBackground);
     return s;
   }
-  // The number of back-buffer pixels that differ from reference.
-  int differences(const DibSurface& reference) {
+  // The number of back-buffer pixels in r that differ from reference.
+  int differences(const DibSurface& reference, const EditorRect& r = kEditorRect) {
     int n = 0;
-    for (int y = 0; y < kEditorHeight; ++y)
-      for (int x = 0; x < kEditorWidth; ++x) n += std::memcmp(window.surface()->at(x, y), reference.at(x, y), 3) != 0;
+    for (int y = r.y; y < r.y + r.h; ++y)
+      for (int x = r.x; x < r.x + r.w; ++x) n += std::memcmp(window.surface()->at(x, y), reference.at(x, y), 3) != 0;
     return n;
   }
 

@@ -1,7 +1,7 @@
 // Text layout of the bitmap fonts: widths, alignment flags, clipping at both edges and unknown characters.
 #include <gtest/gtest.h>
 
-#include <array>
+#include <tuple>
 #include <numeric>
 #include <string>
 
@@ -66,20 +66,28 @@ TEST_F(FontTest, ClipsAtBothEdges) {
   EXPECT_EQ(row(4), "..BBB.......");
 }
 
-TEST(EditorFontsTest, WidthTablesFillTheirStrips) {
-  EXPECT_EQ(std::string(kFontCharacterSet).find(",+"), 8u);
-  EXPECT_EQ(std::accumulate(kSmallFontWidths.begin(), kSmallFontWidths.end(), 0), kSmallFontWidth);
-  EXPECT_EQ(std::accumulate(kLargeFontWidths.begin(), kLargeFontWidths.end(), 0), kLargeFontWidth);
-  BitmapFont small(nullptr);
-  small.setGlyphs(kFontCharacterSet, kSmallFontWidths.data());
-  EXPECT_EQ(small.textWidth("W1+,z"), 9 + 4 + 6 + 2 + 4);
-  // The strips come from the module's own resources, through the same parser as a picked file.
-  for (const auto& [id, width, height] : {std::array<int, 3>{kSmallFontResource, kSmallFontWidth, kSmallFontHeight},
-                                          std::array<int, 3>{kLargeFontResource, kLargeFontWidth, kLargeFontHeight}}) {
+// The module's glyph strips, read through the same parser as a picked file, against the width tables: the
+// widths fill the strip, every glyph but the space has ink in its own cell, and two cells never touch.
+TEST(EditorFontsTest, EveryGlyphHasInkInItsOwnCell) {
+  const std::tuple<int, const int*, int, int> strips[] = {
+      {kSmallFontResource, kSmallFontWidths.data(), kSmallFontWidth, kSmallFontHeight},
+      {kLargeFontResource, kLargeFontWidths.data(), kLargeFontWidth, kLargeFontHeight}};
+  for (const auto& [id, widths, width, height] : strips) {
     SkinBitmap strip;
-    ASSERT_TRUE(strip.loadResource(id)) << id;
-    EXPECT_EQ(strip.width(), width);
-    EXPECT_EQ(strip.height(), height);
+    ASSERT_TRUE(strip.loadResource(id) && strip.width() == width && strip.height() == height) << id;
+    ASSERT_EQ(std::accumulate(widths, widths + kFontCharacterCount, 0), width) << id;
+    auto blank = [&](int x) {
+      SkinColour c;
+      for (int y = 0; y < height; ++y)
+        if (strip.pixelColour(x, y, &c) && c.g != 0) return false;
+      return true;
+    };
+    for (int k = 0, x0 = 0; k < kFontCharacterCount; x0 += widths[k++]) {
+      bool ink = false;
+      for (int x = x0; x < x0 + widths[k]; ++x) ink = ink || !blank(x);
+      EXPECT_EQ(ink, k != 0) << id << ": glyph " << k;
+      EXPECT_TRUE(k == 0 || blank(x0 - 1) || blank(x0)) << id << ": glyphs " << k - 1 << " and " << k << " touch";
+    }
   }
 }
 

@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <cstdio>
-#include <fstream>
 
 #include "editor/BmpBuilder.h"
 #include "editor/SkinBitmap.h"
@@ -13,13 +12,10 @@ namespace {
 
 // A 24-bit picture whose pixel (x, y) is B = x, G = y, R = 7.
 test::BmpLayout gradient(int headerSize, int width, int height, int bits = 24) {
-  test::BmpLayout s;
+  test::BmpLayout s =
+      test::colourBitmap(width, height, [](int x, int y, int ch) { return uint8_t(ch == 0 ? x : ch == 1 ? y : 7); });
   s.headerSize = headerSize;
-  s.width = width;
-  s.height = height;
   s.bits = bits;
-  s.colours = 0;
-  s.pixel = [](int x, int y, int ch) { return uint8_t(ch == 0 ? x : ch == 1 ? y : 7); };
   return s;
 }
 
@@ -56,9 +52,7 @@ TEST(LoaderTest, HeaderKindsRowOrdersResourcesAndFiles) {
   EXPECT_TRUE(c.b == 9 && c.g == 18 && c.r == 27);
   EXPECT_FALSE(b.loadResource(999) || !b.empty() || SkinBitmap(nullptr).loadResource(202));
 
-  const std::string path = testing::TempDir() + "editor_loader.bmp";
-  const auto file = test::makeFile(gradient(40, 750, 167));
-  std::ofstream(path, std::ios::binary).write(reinterpret_cast<const char*>(file.data()), file.size());
+  const std::string path = test::writeFile(testing::TempDir() + "editor_loader.bmp", gradient(40, 750, 167));
   ASSERT_TRUE(b.loadFile(path, 750, 167));
   expectGradient(b, 750, 167);
   EXPECT_FALSE(b.loadFile(path, 750, 166) || !b.empty() || b.loadFile(path + ".missing", 750, 167));

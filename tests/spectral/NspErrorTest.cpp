@@ -1,5 +1,5 @@
-// Every argument the routines refuse sets the error status and leaves the data untouched; the default
-// handler records and returns, the exit handler ends the process.
+// Every argument the routines refuse sets the error status and leaves the data untouched under the default
+// handler, which records and returns; the exit handler ends the process.
 #include <functional>
 
 #include "SpectralTestSupport.h"
@@ -7,13 +7,7 @@
 using namespace ulvetta;
 using namespace spectral_test;
 
-TEST(NspStatus, DefaultHandlerRecordsAndReturnsAndExitHandlerEndsTheProcess) {
-    nspRedirectError(nullptr);
-    std::vector<float> x(4, 1.0f);
-    nspsRealFftl(x.data(), 32, FlagForward | FlagOutPerm);  // the process goes on
-    EXPECT_EQ(nspGetErrStatus(), NspStsBadArg);
-    EXPECT_EQ(x, std::vector<float>(4, 1.0f));
-    nspSetErrStatus(NspStsOk);
+TEST(NspStatus, ExitHandlerEndsTheProcessWithTheMessage) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
     EXPECT_EXIT(
         {
@@ -34,6 +28,7 @@ TEST(NspArgumentErrors, EveryRefusedCallSetsTheStatusAndLeavesItsData) {
     FirState uninitialised;
     const std::function<void()> badArguments[] = {
         [&] { nspsRealFftl(p, -1, fwd); },
+        [&] { nspsRealFftl(p, 32, fwd); },
         [&] { nspsRealFftl(nullptr, 6, fwd); },
         [&] { nspsRealFftl(p, 6, fwd | FlagOutPack); },
         [&] { nspsCcsFftl(p, 6, inv | FlagInPack); },

@@ -48,17 +48,6 @@ inline float permRe(const float* x, std::size_t n, std::size_t k) {
 }
 inline float permIm(const float* x, std::size_t n, std::size_t k) { return k == 0 || k == n / 2 ? 0.0f : x[2 * k + 1]; }
 
-// The instruction sets this build and processor can run.
-inline std::vector<ulvetta::spectral::Isa> availableIsas() {
-    using ulvetta::spectral::Isa;
-    std::vector<Isa> out;
-    const Isa before = ulvetta::spectral::activeIsa();
-    for (Isa i : {Isa::Scalar, Isa::Sse2, Isa::Avx2})
-        if (ulvetta::spectral::selectIsa(i)) out.push_back(i);
-    ulvetta::spectral::selectIsa(before);
-    return out;
-}
-
 // Selects an instruction set for one scope and restores the previous one.
 class IsaScope {
 public:
@@ -72,5 +61,14 @@ private:
     ulvetta::spectral::Isa before_;
     bool ok_;
 };
+
+// The instruction sets this build and processor can run.
+inline std::vector<ulvetta::spectral::Isa> availableIsas() {
+    using ulvetta::spectral::Isa;
+    std::vector<Isa> out;
+    for (Isa i : {Isa::Scalar, Isa::Sse2, Isa::Avx2})
+        if (IsaScope(i).ok()) out.push_back(i);
+    return out;
+}
 
 }  // namespace spectral_test

@@ -4,8 +4,6 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <cmath>
-#include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <vector>
@@ -15,40 +13,35 @@
 #include "editor/headless/EventScript.h"
 #include "editor/headless/HeadlessHost.h"
 #include "filter/ReverbCore.h"
+#include "platform/ProfileFile.h"
 
 namespace ulvetta {
 namespace {
 
-struct Rgb {
-  int r, g, b;
-  bool operator==(const Rgb& o) const { return r == o.r && g == o.g && b == o.b; }
-};
-std::ostream& operator<<(std::ostream& os, const Rgb& c) { return os << c.r << "," << c.g << "," << c.b; }
-
-// Column x of the default horizontal gradient from 19, 23, 35 to 15, 33, 36.
-Rgb gradient(int x) {
+// Column x of the default horizontal gradient from 19, 23, 35 to 15, 33, 36, as 0xRRGGBB.
+uint32_t gradient(int x) {
   const double t = x / 750.0;
-  auto mix = [t](int a, int b) { return static_cast<int>(a * (1 - t) + b * t); };
-  return {mix(19, 15), mix(23, 33), mix(35, 36)};
+  auto mix = [t](int a, int b, int shift) { return static_cast<uint32_t>(a * (1 - t) + b * t) << shift; };
+  return mix(19, 15, 16) | mix(23, 33, 8) | mix(35, 36, 0);
 }
 
-Rgb pictureAt(int resource, int x, int y) {
+uint32_t rgbOf(const uint8_t* bgr) { return bgr[2] << 16 | bgr[1] << 8 | bgr[0]; }
+
+uint32_t pictureAt(int resource, int x, int y) {
   SkinBitmap b;
   SkinColour c;
   EXPECT_TRUE(b.loadResource(resource) && b.pixelColour(x, y, &c)) << resource;
-  return {c.r, c.g, c.b};
+  return c.r << 16 | c.g << 8 | c.b;
 }
 
 class WorkingPagesTest : public ::testing::Test {
  protected:
   void SetUp() override {
+    ASSERT_FALSE(pages.failed());
     host.show(&pages.window());
     host.settle();
   }
-  Rgb pixel(int x, int y) {
-    const uint8_t* p = pages.window().surface()->at(x, y);
-    return {p[2], p[1], p[0]};
-  }
+  uint32_t pixel(int x, int y) { return rgbOf(pages.window().surface()->at(x, y)); }
   void play(const std::string& text) {
     EventScript script;
     std::string error;
@@ -71,12 +64,6 @@ class WorkingPagesTest : public ::testing::Test {
   PageSet pages{core, &host};
 };
 
-TEST_F(WorkingPagesTest, DraggingDecayToTheTopSetsItsMaximum) {
-  ASSERT_FALSE(pages.failed());
-  play("press 325 100\ndrag 325 60\ndrag 325 0\nrelease 325 0");
-  EXPECT_EQ(core.getValue(kDecay), 100);
-}
-
 // The optional columns per Algorithm: Pre Delay (frame 255, 15; fader 273..294), Diffusion (419; 437..458) and
 // Early Reflections (460; 478..499). A hidden column shows only the gradient over its whole height and its
 // fader ignores a press.
@@ -86,7 +73,7 @@ TEST_F(WorkingPagesTest, AlgorithmDecidesWhichColumnsShowAndRespond) {
     int frameX, faderX;
   };
   const Column columns[] = {{kPreDelay, 255, 273}, {kDiffusion, 419, 437}, {kEarlyReflections, 460, 478}};
-  const Rgb frameCorner = pictureAt(204, 0, 0);
+  const uint32_t frameCorner = pictureAt(204, 0, 0);
   for (int algorithm : {0, 3, 7}) {
     changeElsewhere(kAlgorithm, algorithm);
     host.settle();
@@ -98,7 +85,7 @@ TEST_F(WorkingPagesTest, AlgorithmDecidesWhichColumnsShowAndRespond) {
       } else {
         int off = 0;
         for (int y = 15; y < 154; ++y)
-          for (int x = c.frameX; x < c.frameX + 38; ++x) off += !(pixel(x, y) == gradient(x));
+          for (int x = c.frameX; x < c.frameX + 38; ++x) off += pixel(x, y) != gradient(x);
         EXPECT_EQ(off, 0);
       }
       // A press at the top of the track raises a responding fader from half way to its maximum.
@@ -112,8 +99,8 @@ TEST_F(WorkingPagesTest, AlgorithmDecidesWhichColumnsShowAndRespond) {
 }
 
 TEST_F(WorkingPagesTest, TabAndPageButtonsSwitchPagesAndTheLogoShowsAbout) {
-  const Rgb button1Lit = pictureAt(219, 6, 6), button1Dim = pictureAt(221, 6, 6);
-  ASSERT_FALSE(button1Lit == button1Dim);
+  const uint32_t button1Lit = pictureAt(219, 6, 6), button1Dim = pictureAt(221, 6, 6);
+  ASSERT_NE(button1Lit, button1Dim);
   EXPECT_EQ(pixel(512, 145), button1Lit);
   play("key 9");
   EXPECT_EQ(pages.window().currentPage(), kFilterPage);
@@ -133,39 +120,37 @@ TEST_F(WorkingPagesTest, TabAndPageButtonsSwitchPagesAndTheLogoShowsAbout) {
   EXPECT_FALSE(pages.window().keyDown(kKeyTab));
 }
 
-TEST_F(WorkingPagesTest, RightPressOpensTheMenuAndNeverReachesAControl) {
-  const int32_t decay = core.getValue(kDecay);
-  play("rpress 325 60\nrrelease 325 60\nkey 36");  // Home would raise a focused fader to its top
-  ASSERT_EQ(host.menus().size(), 1u);
-  EXPECT_EQ(host.menus()[0].x, 325);
-  EXPECT_EQ(host.menus()[0].y, 60);
-  EXPECT_EQ(core.getValue(kDecay), decay);
-}
-
-// A menu action reaches the profile file and the page repaints with it at once.
-TEST_F(WorkingPagesTest, MenuColourChoiceRepaintsThePage) {
+// A right press opens the menu where it was made and never reaches a control (Home would raise a focused
+// fader to its top); a colour chosen from it reaches the profile file and the page repaints with it at once.
+TEST_F(WorkingPagesTest, RightPressOpensTheMenuAndItsColourChoiceRepaintsThePage) {
   const std::filesystem::path dir = std::filesystem::temp_directory_path() / ("pages-" + std::to_string(getpid()));
   std::filesystem::create_directories(dir);
-  const std::string profile = (dir / "Ulvetta.ini").string();
-  std::ofstream(profile) << "[Colours]\r\n";
+  std::ofstream(dir / "Ulvetta.ini") << "[Colours]\r\n";
+  const int32_t decay = core.getValue(kDecay);
   {
-    HeadlessHost withProfile(profile, dir.string() + "/");
+    HeadlessHost withProfile((dir / "Ulvetta.ini").string(), dir.string() + "/");
     PageSet set(core, &withProfile);
     withProfile.show(&set.window());
     withProfile.settle();
     withProfile.queueMenu(20010);  // Set Background Colour 1
     withProfile.queueColour({200, 100, 50, 255});
-    set.window().mouse(700, 5, kRightPress, 0);
-    const uint8_t* p = set.window().surface()->at(0, 100);
-    EXPECT_EQ((Rgb{p[2], p[1], p[0]}), (Rgb{200, 100, 50}));
+    set.window().mouse(325, 60, kRightPress, 0);
+    set.window().mouse(325, 60, kRightRelease, 0);
+    set.window().keyDown(kKeyHome);
+    ASSERT_EQ(withProfile.menus().size(), 1u);
+    EXPECT_TRUE(withProfile.menus()[0].x == 325 && withProfile.menus()[0].y == 60);
+    EXPECT_EQ(rgbOf(set.window().surface()->at(0, 100)), 0xC86432u);
   }
+  // 200 + 100 x 256 + 50 x 65536
+  EXPECT_EQ(ProfileFile((dir / "Ulvetta.ini").string()).read("Colours", "Back1a"), "3302600");
+  EXPECT_EQ(core.getValue(kDecay), decay);
   std::filesystem::remove_all(dir);
 }
 
 TEST_F(WorkingPagesTest, ChangesMadeElsewhereRedrawTheCurrentPage) {
   // Decay 47 of 100 puts the thumb's top at 39 + trunc(95 x 0.53 + 0.5) = 89; 80 puts it at 58. The groove
   // is the same all along, so the thumb's pixels move by 31 rows unchanged.
-  std::vector<Rgb> before;
+  std::vector<uint32_t> before;
   for (int y = 89; y < 104; ++y)
     for (int x = 314; x < 336; ++x) before.push_back(pixel(x, y));
   changeElsewhere(kDecay, 80);
