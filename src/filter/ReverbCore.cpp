@@ -21,15 +21,40 @@ double levelGain(int32_t id, int32_t value) {
 
 }  // namespace
 
-ReverbCore::Guard::Guard(ReverbCore& core) : core_(core) {
-    core_.lock_.lock();
-    ++core_.lockDepth_;
+namespace {
+// Its address marks the thread that holds a core's lock.
+thread_local char threadMark;
+}  // namespace
+
+ReverbCore::Guard::Guard(ReverbCore& core, bool streaming) : core_(core) {
+    const void* self = &threadMark;
+    if (core_.owner_.load(std::memory_order_relaxed) == self) {
+        core_.lock_.lock();  // nested in an operation of this thread
+    } else if (streaming) {
+        if (!core_.lock_.tryLock()) {
+            core_.turnstile_.lock();
+            core_.lock_.lock();
+            core_.turnstile_.unlock();
+        }
+    } else {
+        core_.turnstile_.lock();
+        core_.turnstile_.unlock();
+        core_.lock_.lock();
+    }
+    if (core_.lockDepth_++ == 0) {
+        core_.owner_.store(self, std::memory_order_relaxed);
+        core_.engine_.BeginChanges();
+    }
 }
 
 ReverbCore::Guard::~Guard() {
-    if (--core_.lockDepth_ == 0 && !core_.pendingReports_.empty()) {
-        core_.deliverCaptureReports();
-        return;
+    if (core_.lockDepth_ == 1) core_.engine_.EndChanges();  // prepares what the changes made stale
+    if (--core_.lockDepth_ == 0) {
+        core_.owner_.store(nullptr, std::memory_order_relaxed);
+        if (!core_.pendingReports_.empty()) {
+            core_.deliverCaptureReports();
+            return;
+        }
     }
     core_.lock_.unlock();
 }
@@ -211,19 +236,20 @@ bool ReverbCore::setValueAndNotify(int32_t id, int32_t value) {
 
 void ReverbCore::setFormat(float sampleRate, int32_t, int32_t, int32_t) {
     Guard g(*this);
-    sampleRate_ = sampleRate;
+    const double rounded = std::round(static_cast<double>(sampleRate));  // NaN fails both tests
+    if (rounded >= 1.0 && rounded <= ReverbEngine::kMaxSampleRate) sampleRate_ = sampleRate;
 }
 
 int32_t ReverbCore::processStereo(const float* inLeft, const float* inRight, float* outLeft, float* outRight,
                                   int32_t frames, int32_t stride, int32_t /*restart*/, int32_t flush,
                                   int32_t accumulate) {
-    Guard g(*this);
+    Guard g(*this, true);
     return engine_.ProcessBlock(outLeft, outRight, inLeft, inRight, frames, stride, accumulate == 1, flush);
 }
 
 int32_t ReverbCore::trackLevel(const float* samples, const void*, int32_t count, int32_t stride, int32_t,
                                int32_t) {
-    Guard g(*this);
+    Guard g(*this, true);
     static const float attack = static_cast<float>(1.0 - std::exp(-0.030642888258557023));
     static const float release = static_cast<float>(std::exp(-6.128577478167001e-05));
     for (int32_t i = 0; i < count; ++i) {
@@ -238,7 +264,7 @@ int32_t ReverbCore::trackLevel(const float* samples, const void*, int32_t count,
 
 int32_t ReverbCore::copyMono(const float* source, float* destination, int32_t count, int32_t, int32_t,
                              int32_t add) {
-    Guard g(*this);
+    Guard g(*this, true);
     for (int32_t i = 0; i < count; ++i) destination[i] = add ? destination[i] + source[i] : source[i];
     return count;
 }
@@ -261,6 +287,7 @@ bool ReverbCore::startStreaming() {
     if (!applied_) applyAll();
     stopped_ = false;
     engine_.ResetState();
+    engine_.SetStreaming(true);
     return true;
 }
 
@@ -272,6 +299,7 @@ void ReverbCore::resumeAfterFlush() {
 void ReverbCore::stopStreaming() {
     Guard g(*this);
     stopped_ = true;
+    engine_.SetStreaming(false);
 }
 
 int32_t ReverbCore::stateSize() { return kCoreStateSize; }

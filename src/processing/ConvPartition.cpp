@@ -54,6 +54,15 @@ void ConvPartition::RunJob() {
     }
 }
 
+void ConvPartition::Clear() {
+    const bool worker = HasWorker();
+    if (worker) WaitDone();
+    for (auto* p : {&inputLeft, &inputRight}) std::fill(p->get(), p->get() + 2 * static_cast<size_t>(size), 0.0f);
+    for (auto* p : {&outputLeft, &outputRight, &nextLeft, &nextRight}) std::fill(p->get(), p->get() + size, 0.0f);
+    readPos = 0;
+    if (worker) doneEvent_->set();  // the next hand-off finds the worker idle, as after its start
+}
+
 bool ConvPartition::StartWorker(std::size_t stackBytes) {
     StopWorker();
     workEvent_.reset(new Event);

@@ -57,6 +57,9 @@ struct ConvPartition {
     // Transforms the window and multiplies by the segment's spectrum; the first size values of the inverse
     // become the next result (both channels).
     void RunJob();
+    // Zeroes the window, the results and the play position, keeping the spectra; first waits for a job the
+    // worker still runs. Allocates nothing.
+    void Clear();
 
     // Starts the worker with its two events; it signals doneEvent once at start.
     bool StartWorker(std::size_t stackBytes);
