@@ -52,6 +52,7 @@ private:
     int64_t M_ = 1;
     bool fine_ = false;           // rows blended from the fine table
     std::vector<double> table_;   // L exact rows of N, or kFineRows + 1 fine rows
+    std::vector<double> slopes_;  // fine rows only: row q + 1 - row q, for q below kFineRows
     int64_t exactLimit_ = kExactRows;
     double inputRate_ = 44100.0;
     double cutoff_ = 0.0;

@@ -52,7 +52,8 @@ struct ConvPartition {
     ConvPartition(const ConvPartition&) = delete;
     ConvPartition& operator=(const ConvPartition&) = delete;
 
-    // Allocates the buffers of a partition of s samples and transform order o (zeroed, spectra empty).
+    // Allocates the buffers of a partition of s samples and transform order o: window and results zeroed,
+    // the first half of each spectrum zeroed (the segment goes into it), the work space left unset.
     void Allocate(int32_t s, int32_t o);
     // Transforms the window and multiplies by the segment's spectrum; the first size values of the inverse
     // become the next result (both channels).
