@@ -178,6 +178,11 @@ public:
     // Any thread; takes the core's lock (a block waits for the copy); allocates the two vectors.
     bool preparedResponse(std::vector<float>& left, std::vector<float>& right);
 
+    // [any thread but the streaming one] no lock; never allocates. Waits until no convolution response is
+    // being prepared off the calling threads; the next block plays what was prepared. For offline hosts
+    // that change settings while rendering, and for tests.
+    void waitForPreparation() { engine_.WaitForPreparation(); }
+
     // The engine for tests (through EngineProbe) and diagnostics; use it only while nothing else uses the
     // core.
     const ReverbEngine& engineForInspection() const { return engine_; }
