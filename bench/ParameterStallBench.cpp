@@ -76,33 +76,23 @@ void BM_StallUnderParameterChanges(benchmark::State& state) {
     state.SetLabel(kAlgorithmNames[mode]);
 }
 
-// Cold: the algorithm alternates between two convolutions, so every preparation converts its response.
-void BM_PrepareCold(benchmark::State& state) {
-    const int rate = static_cast<int>(state.range(0));
+// Each iteration sets the parameter id to one of two values, in turn, in a core applied at the rate.
+void alternate(benchmark::State& state, int32_t id, int32_t a, int32_t b) {
     ReverbCore core;
-    core.setFormat(static_cast<float>(rate), 0, 2, 2);
+    core.setFormat(static_cast<float>(state.range(0)), 0, 2, 2);
     core.setValue(kAlgorithm, 4);
     core.applyAll();
-    int mode = 4;
+    int32_t value = a;
     for (auto _ : state) {
-        mode = mode == 4 ? 5 : 4;
-        core.setValue(kAlgorithm, mode);
+        value = value == a ? b : a;
+        core.setValue(id, value);
     }
 }
 
-// Warm: Decay alternates in algorithm 5.
-void BM_PrepareWarm(benchmark::State& state) {
-    const int rate = static_cast<int>(state.range(0));
-    ReverbCore core;
-    core.setFormat(static_cast<float>(rate), 0, 2, 2);
-    core.setValue(kAlgorithm, 5);
-    core.applyAll();
-    int decay = core.getValue(kDecay);
-    for (auto _ : state) {
-        decay = decay == 100 ? 99 : 100;
-        core.setValue(kDecay, decay);
-    }
-}
+// Cold: the algorithm alternates between two convolutions, so every preparation converts its response.
+void BM_PrepareCold(benchmark::State& state) { alternate(state, kAlgorithm, 4, 5); }
+// Warm: Decay alternates, and the conversion is reused.
+void BM_PrepareWarm(benchmark::State& state) { alternate(state, kDecay, 99, 100); }
 
 }  // namespace
 

@@ -25,15 +25,16 @@ ResponsePreparer::~ResponsePreparer() {
     thread_->join();
 }
 
+std::unique_ptr<ConvolutionResponse> ResponsePreparer::Forget() {
+    MutexLock l(handoff_);
+    ++generation_;
+    requestPending_ = false;
+    readyFlag_ = false;
+    return std::move(ready_);
+}
+
 std::unique_ptr<ConvolutionResponse> ResponsePreparer::Prepare(const ResponseKey& key, bool startWorkers) {
-    std::unique_ptr<ConvolutionResponse> ready;
-    {
-        MutexLock l(handoff_);
-        ++generation_;
-        requestPending_ = false;
-        ready = std::move(ready_);
-        readyFlag_ = false;
-    }
+    std::unique_ptr<ConvolutionResponse> ready = Forget();
     if (ready && ready->key == key) return ready;
     ready.reset();
     MutexLock b(buildLock_);
@@ -54,14 +55,7 @@ void ResponsePreparer::Request(const ResponseKey& key, bool startWorkers) {
     wake_.set();
 }
 
-void ResponsePreparer::Drop() {
-    std::unique_ptr<ConvolutionResponse> dropped;
-    MutexLock l(handoff_);
-    ++generation_;
-    requestPending_ = false;
-    dropped = std::move(ready_);
-    readyFlag_ = false;
-}
+void ResponsePreparer::Drop() { Forget(); }
 
 void ResponsePreparer::WaitIdle() {
     for (;;) {

@@ -53,6 +53,9 @@ private:
     // The stored response of mode converted to rate, interleaved; converted once per mode and rate.
     const float* Converted(int mode, int32_t rate, int32_t& frames);
     void Loop();
+    // Drops outstanding requests, marks a preparation in progress for discarding, and hands back a finished
+    // response not yet taken.
+    std::unique_ptr<ConvolutionResponse> Forget();
 
     Mutex buildLock_;  // held for one whole preparation; guards the conversion cache
     int32_t cachedMode_ = -1, cachedRate_ = 0, cachedFrames_ = 0;

@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <cmath>
 #include <cstring>
 #include <memory>
@@ -130,27 +129,6 @@ TEST(AlgorithmSwitch, LoadsTheClampedRowAndRestoresWhatWasSetBeforeLeaving) {
     EXPECT_EQ(c.memoryValue(2, 14), 3000);  // column 14 holds Notch Freq
     c.setNormalized(kAlgorithm, 0.0f);  // a position changes only the mode, loading no row
     EXPECT_EQ(c.getValue(kDecay), 77);
-}
-
-// The core's lock keeps parameter changes and blocks apart; exercised from two threads.
-TEST(CoreProcessing, ParameterChangesWhileStreaming) {
-    ReverbCore c;
-    c.startStreaming();
-    std::atomic<bool> done{false};
-    Thread editor;
-    ASSERT_TRUE(editor.start([&] {
-        for (int i = 0; i < 200; ++i) {
-            c.setValue(kDecay, i % 100);
-            c.setNormalized(kRoomSize, (i % 10) / 10.0f);
-            c.setValue(kAlgorithm, (i / 20) % 2 ? 0 : 7);
-        }
-        done = true;
-    }, 0));
-    std::vector<float> in(2 * 256, 0.1f), out(2 * 256);
-    for (int blocks = 0; !done || blocks < 10; ++blocks)
-        ASSERT_EQ(c.processStereo(in.data(), in.data() + 1, out.data(), out.data() + 1, 256, 2, 0, 0, 0), 256);
-    editor.join();
-    for (float v : out) EXPECT_TRUE(std::isfinite(v));
 }
 
 // Only the rates a host may give (1..768000 Hz, after rounding) reach the engine; at both ends of that
