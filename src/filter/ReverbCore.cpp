@@ -26,20 +26,16 @@ namespace {
 thread_local char threadMark;
 }  // namespace
 
-ReverbCore::Guard::Guard(ReverbCore& core, bool streaming) : core_(core) {
+ReverbCore::Guard::Guard(ReverbCore& core) : core_(core) {
     const void* self = &threadMark;
     if (core_.owner_.load(std::memory_order_relaxed) == self) {
         core_.lock_.lock();  // nested in an operation of this thread
-    } else if (streaming) {
-        if (!core_.lock_.tryLock()) {
-            core_.turnstile_.lock();
-            core_.lock_.lock();
-            core_.turnstile_.unlock();
-        }
     } else {
+        // One waiter at a time waits for the lock itself, holding the turnstile: a thread that has just
+        // released the lock queues at the turnstile behind it instead of taking the lock again first.
         core_.turnstile_.lock();
-        core_.turnstile_.unlock();
         core_.lock_.lock();
+        core_.turnstile_.unlock();
     }
     if (core_.lockDepth_++ == 0) {
         core_.owner_.store(self, std::memory_order_relaxed);
@@ -243,13 +239,13 @@ void ReverbCore::setFormat(float sampleRate, int32_t, int32_t, int32_t) {
 int32_t ReverbCore::processStereo(const float* inLeft, const float* inRight, float* outLeft, float* outRight,
                                   int32_t frames, int32_t stride, int32_t /*restart*/, int32_t flush,
                                   int32_t accumulate) {
-    Guard g(*this, true);
+    Guard g(*this);
     return engine_.ProcessBlock(outLeft, outRight, inLeft, inRight, frames, stride, accumulate == 1, flush);
 }
 
 int32_t ReverbCore::trackLevel(const float* samples, const void*, int32_t count, int32_t stride, int32_t,
                                int32_t) {
-    Guard g(*this, true);
+    Guard g(*this);
     static const float attack = static_cast<float>(1.0 - std::exp(-0.030642888258557023));
     static const float release = static_cast<float>(std::exp(-6.128577478167001e-05));
     for (int32_t i = 0; i < count; ++i) {
@@ -264,7 +260,7 @@ int32_t ReverbCore::trackLevel(const float* samples, const void*, int32_t count,
 
 int32_t ReverbCore::copyMono(const float* source, float* destination, int32_t count, int32_t, int32_t,
                              int32_t add) {
-    Guard g(*this, true);
+    Guard g(*this);
     for (int32_t i = 0; i < count; ++i) destination[i] = add ? destination[i] + source[i] : source[i];
     return count;
 }

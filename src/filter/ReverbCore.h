@@ -5,10 +5,9 @@
 // through these operations.
 //
 // Threads: each operation's tag says who may call it, which lock it takes and whether it may allocate.
-// The lock is re-entrant because operations call one another under it. It is fair to the stream: a
-// streaming call that finds it held closes a turnstile that other threads pass before they take the lock,
-// so it waits for the holder alone, never for a queue of parameter changes. A parameter change holds the
-// lock briefly: while streaming, a convolution response is prepared on the engine's preparation thread
+// The lock is re-entrant because operations call one another under it. Threads take it in turns: the
+// streaming thread and a thread changing parameters as fast as it can alternate, so neither waits for more
+// than the other's operation in progress and the next one queued. A parameter change holds the lock briefly: while streaming, a convolution response is prepared on the engine's preparation thread
 // and switched in by a later block; otherwise it is prepared once, when the outermost operation ends. Listener refreshes and a
 // CoreHost other than the core itself run with the lock held, so they must not wait for a thread that
 // needs it. Capture reports are made after the outermost lock is released, in the order of the changes.
@@ -194,11 +193,11 @@ private:
         int32_t id;
         float position;
     };
-    // Holds the core's lock; the outermost guard brackets the engine's changes and delivers the queued
-    // capture reports after unlocking. A streaming guard has the right of way (see the header).
+    // Holds the core's lock, taken in turns (see the header); the outermost guard brackets the engine's
+    // changes and delivers the queued capture reports after unlocking.
     class Guard {
     public:
-        explicit Guard(ReverbCore& core, bool streaming = false);
+        explicit Guard(ReverbCore& core);
         ~Guard();
         Guard(const Guard&) = delete;
         Guard& operator=(const Guard&) = delete;
@@ -213,7 +212,7 @@ private:
     void deliverCaptureReports();
 
     Mutex lock_;
-    Mutex turnstile_;                          // closed by a streaming call waiting for lock_
+    Mutex turnstile_;                          // held by the one thread waiting for lock_
     std::atomic<const void*> owner_{nullptr};  // a mark of the thread holding lock_, or null
     int lockDepth_ = 0;  // guards held by the locking thread
     std::vector<CaptureReport> pendingReports_;
