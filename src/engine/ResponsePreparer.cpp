@@ -55,7 +55,17 @@ void ResponsePreparer::Request(const ResponseKey& key, bool startWorkers) {
     wake_.set();
 }
 
-void ResponsePreparer::Drop() { Forget(); }
+void ResponsePreparer::Drop() { Discard(Forget()); }
+
+void ResponsePreparer::Discard(std::unique_ptr<ConvolutionResponse> r) {
+    if (!r) return;
+    if (!thread_) return;  // no preparation thread: destroyed here
+    {
+        MutexLock l(handoff_);
+        discarded_.push_back(std::move(r));
+    }
+    wake_.set();
+}
 
 void ResponsePreparer::WaitIdle() {
     for (;;) {
@@ -85,12 +95,14 @@ void ResponsePreparer::Loop() {
         wake_.wait();
         for (;;) {
             std::unique_ptr<ConvolutionResponse> spent;  // destroyed with no lock held
+            std::vector<std::unique_ptr<ConvolutionResponse>> discarded;
             ResponseKey key;
             bool workers = true, due = false;
             uint32_t generation = 0;
             {
                 MutexLock l(handoff_);
                 spent = std::move(retired_);
+                discarded.swap(discarded_);
                 if (requestPending_ && !stop_) {
                     key = requested_;
                     workers = requestWorkers_;
@@ -100,6 +112,7 @@ void ResponsePreparer::Loop() {
                 }
             }
             spent.reset();
+            discarded.clear();
             if (!due) break;
             std::unique_ptr<ConvolutionResponse> built;
             {

@@ -37,8 +37,11 @@ public:
     // use, which allocates).
     void Request(const ResponseKey& key, bool startWorkers);
     // Forgets outstanding requests and finished responses not yet taken; a preparation in progress is
-    // discarded when it ends. Never waits for it; destroys a dropped response on the calling thread.
+    // discarded when it ends. Never waits for it.
     void Drop();
+    // Destroys a response no longer played: on the preparation thread when it runs (joining the response's
+    // workers can take as long as a job they are busy with), otherwise now.
+    void Discard(std::unique_ptr<ConvolutionResponse> r);
     // Blocks until no request is outstanding and no preparation runs.
     void WaitIdle();
 
@@ -68,6 +71,7 @@ private:
     bool building_ = false;
     uint32_t generation_ = 0;  // raised by Prepare and Drop: a preparation started before is discarded
     std::unique_ptr<ConvolutionResponse> ready_, retired_;
+    std::vector<std::unique_ptr<ConvolutionResponse>> discarded_;
     std::atomic<bool> readyFlag_{false};
     std::atomic<bool> stop_{false};
     Event wake_;  // a request, a retired response to destroy, or the stop

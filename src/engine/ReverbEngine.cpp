@@ -215,7 +215,8 @@ void ReverbEngine::CommitResponse(bool mayDefer) {
 }
 
 void ReverbEngine::InstallResponse(std::unique_ptr<ConvolutionResponse> r) {
-    response_ = std::move(r);  // the previous one goes here, off the audio path, its workers joined
+    std::swap(response_, r);
+    preparer_.Discard(std::move(r));
     StartResponse();
 }
 
@@ -230,7 +231,7 @@ void ReverbEngine::StartResponse() {
 
 void ReverbEngine::DropResponse() {
     preparer_.Drop();
-    response_.reset();
+    preparer_.Discard(std::move(response_));
 }
 
 void ReverbEngine::SilenceNetworks() {
