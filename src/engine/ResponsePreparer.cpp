@@ -44,9 +44,13 @@ std::unique_ptr<ConvolutionResponse> ResponsePreparer::Prepare(const ResponseKey
 void ResponsePreparer::Request(const ResponseKey& key, bool startWorkers) {
     {
         MutexLock l(handoff_);
+        // The response on its way (being prepared, or finished and waiting) is already this one.
+        const bool coming = building_ ? buildingKey_ == key && buildingGeneration_ == generation_
+                                      : ready_ != nullptr && ready_->key == key;
+        requestPending_ = !coming;
+        if (coming) return;
         requested_ = key;
         requestWorkers_ = startWorkers;
-        requestPending_ = true;
     }
     if (!thread_) {
         thread_.reset(new Thread);
@@ -104,9 +108,9 @@ void ResponsePreparer::Loop() {
                 spent = std::move(retired_);
                 discarded.swap(discarded_);
                 if (requestPending_ && !stop_) {
-                    key = requested_;
+                    key = buildingKey_ = requested_;
                     workers = requestWorkers_;
-                    generation = generation_;
+                    generation = buildingGeneration_ = generation_;
                     requestPending_ = false;
                     building_ = due = true;
                 }

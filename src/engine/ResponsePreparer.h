@@ -69,6 +69,8 @@ private:
     bool requestPending_ = false;
     bool requestWorkers_ = true;
     bool building_ = false;
+    ResponseKey buildingKey_;          // of the preparation in progress
+    uint32_t buildingGeneration_ = 0;  // generation_ when it started
     uint32_t generation_ = 0;  // raised by Prepare and Drop: a preparation started before is discarded
     std::unique_ptr<ConvolutionResponse> ready_, retired_;
     std::vector<std::unique_ptr<ConvolutionResponse>> discarded_;
