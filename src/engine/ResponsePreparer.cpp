@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <new>
 
 #include "engine/IrResampler.h"
 #include "engine/StoredResponses.h"
@@ -41,32 +42,39 @@ std::unique_ptr<ConvolutionResponse> ResponsePreparer::Prepare(const ResponseKey
     return PrepareImpulse(key, startWorkers);
 }
 
-void ResponsePreparer::Request(const ResponseKey& key, bool startWorkers) {
+bool ResponsePreparer::Request(const ResponseKey& key, bool startWorkers) {
     {
         MutexLock l(handoff_);
         // The response on its way (being prepared, or finished and waiting) is already this one.
         const bool coming = building_ ? buildingKey_ == key && buildingGeneration_ == generation_
                                       : ready_ != nullptr && ready_->key == key;
         requestPending_ = !coming;
-        if (coming) return;
+        if (coming) return true;
         requested_ = key;
         requestWorkers_ = startWorkers;
     }
     if (!thread_) {
         thread_.reset(new Thread);
-        thread_->start([this] { Loop(); }, 0);
+        if (!thread_->start([this] { Loop(); }, 0)) {
+            thread_.reset();
+            MutexLock l(handoff_);
+            requestPending_ = false;
+            return false;
+        }
     }
     wake_.set();
+    return true;
 }
 
 void ResponsePreparer::Drop() { Discard(Forget()); }
 
 void ResponsePreparer::Discard(std::unique_ptr<ConvolutionResponse> r) {
-    if (!r) return;
-    if (!thread_) return;  // no preparation thread: destroyed here
-    {
+    if (!r || !thread_) return;  // without a preparation thread r is destroyed here
+    try {
         MutexLock l(handoff_);
         discarded_.push_back(std::move(r));
+    } catch (const std::bad_alloc&) {
+        return;  // the list could not grow: r, still owned here, is destroyed here
     }
     wake_.set();
 }
@@ -119,9 +127,11 @@ void ResponsePreparer::Loop() {
             discarded.clear();
             if (!due) break;
             std::unique_ptr<ConvolutionResponse> built;
-            {
+            try {
                 MutexLock b(buildLock_);
                 built = PrepareImpulse(key, workers);
+            } catch (const std::bad_alloc&) {
+                // Nothing to publish: the stream keeps the response it plays.
             }
             std::unique_ptr<ConvolutionResponse> replaced, retired;
             {
@@ -129,7 +139,7 @@ void ResponsePreparer::Loop() {
                 building_ = false;
                 // A newer request for another algorithm makes this response useless; one for other settings of
                 // the same algorithm does not: it is still closer to them than the response being played.
-                if (generation != generation_ || (requestPending_ && requested_.mode != key.mode)) {
+                if (!built || generation != generation_ || (requestPending_ && requested_.mode != key.mode)) {
                     replaced = std::move(built);
                 } else {
                     replaced = std::move(ready_);

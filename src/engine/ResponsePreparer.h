@@ -34,8 +34,8 @@ public:
     // is returned instead of preparing again. Waits for a preparation in progress. Allocates.
     std::unique_ptr<ConvolutionResponse> Prepare(const ResponseKey& key, bool startWorkers);
     // Asks the preparation thread for the response of key and returns at once (starts the thread on first
-    // use, which allocates).
-    void Request(const ResponseKey& key, bool startWorkers);
+    // use, which allocates). False when the thread cannot be started: the caller prepares it itself.
+    bool Request(const ResponseKey& key, bool startWorkers);
     // Forgets outstanding requests and finished responses not yet taken; a preparation in progress is
     // discarded when it ends. Never waits for it.
     void Drop();

@@ -4,6 +4,7 @@
 #include <cmath>
 #include <initializer_list>
 #include <iterator>
+#include <new>
 
 namespace ulvetta {
 
@@ -195,7 +196,14 @@ void ReverbEngine::ResetState() {
 }
 
 void ReverbEngine::EndChanges() {
-    if (batchDepth_ > 0 && --batchDepth_ == 0 && responseStale_) CommitResponse(true);
+    if (batchDepth_ > 0 && --batchDepth_ == 0 && responseStale_) {
+        // Called as the core's lock guard goes, so nothing may escape: a preparation that cannot allocate
+        // leaves the response as it was, and the next change of its settings or stream start prepares again.
+        try {
+            CommitResponse(true);
+        } catch (const std::bad_alloc&) {
+        }
+    }
 }
 
 void ReverbEngine::CommitResponse(bool mayDefer) {
@@ -207,10 +215,7 @@ void ReverbEngine::CommitResponse(bool mayDefer) {
         return;
     }
     ++rebuildCount;
-    if (mayDefer && asyncPreparation_) {
-        preparer_.Request(wanted, !inlineLargePartitions);
-        return;
-    }
+    if (mayDefer && asyncPreparation_ && preparer_.Request(wanted, !inlineLargePartitions)) return;
     InstallResponse(preparer_.Prepare(wanted, !inlineLargePartitions));
 }
 
