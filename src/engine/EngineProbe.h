@@ -36,18 +36,20 @@ public:
     const PreDelayLine& preDelayLine() const { return e_.preDelayLine; }
     const BiquadSection& section(int i) const { return e_.filterSections[i]; }
 
-    // The prepared convolution response.
-    int32_t partitionCount() const { return e_.partitionCount; }
-    const ConvPartition& partition(int i) const { return e_.partitions[i]; }
-    int32_t responseLength() const { return e_.irLength; }
-    const float* responseLeft() const { return e_.irLeft.get(); }
-    const float* responseRight() const { return e_.irRight.get(); }
+    // The convolution response being played (null when none is).
+    const ConvolutionResponse* response() const { return e_.response_.get(); }
+    int32_t partitionCount() const { return e_.PartitionCount(); }
+    const ConvPartition& partition(int i) const { return e_.response_->partitions[i]; }
+    int32_t responseLength() const { return e_.response_ ? e_.response_->irLength : 0; }
+    const float* responseLeft() const { return e_.response_->irLeft.get(); }
+    const float* responseRight() const { return e_.response_->irRight.get(); }
 
     // Set-ups: write access to a line or section, and large partitions run as inline jobs on the
     // streaming thread instead of their workers (same output).
     static DelayLine& line(ReverbEngine& e, int i) { return e.delayLines[i]; }
     static PreDelayLine& preDelayLine(ReverbEngine& e) { return e.preDelayLine; }
     static BiquadSection& section(ReverbEngine& e, int i) { return e.filterSections[i]; }
+    static ConvolutionResponse* response(ReverbEngine& e) { return e.response_.get(); }
     static void runLargePartitionsInline(ReverbEngine& e) { e.inlineLargePartitions = true; }
 
 private:

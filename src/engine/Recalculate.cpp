@@ -6,7 +6,6 @@
 
 #include "engine/NetworkTables.h"
 #include "engine/ReverbEngine.h"
-#include "engine/StoredResponses.h"
 
 namespace ulvetta {
 
@@ -29,17 +28,18 @@ void configureTaps(OutputTap* taps, const DelayLine* lines, int lineCount, int t
 
 void ReverbEngine::Recalculate() {
     if (roomSize == -1 || mode == -1) return;
+    if (IsConvolution(mode)) {
+        // Prepared once for a whole group of changes (EndChanges), or now.
+        if (batchDepth_ > 0)
+            responseStale_ = true;
+        else
+            CommitResponse(true);
+        return;
+    }
     ++rebuildCount;
     const int r = sampleRate;
     const int R = roomSize;
-
-    // Every worker stops before anything it uses is rebuilt.
-    StopWorkers();
-    if (mode == 3 || mode == 4 || mode == 5) {
-        const StoredResponse stored = storedResponse(mode);
-        PrepareImpulse(stored.count, stored.frames);
-        return;
-    }
+    DropResponse();
 
     if (mode == 7) {
         // Diffused delay: the pre-delay line becomes the echo memory, two entries (left, right) per frame of
@@ -55,8 +55,6 @@ void ReverbEngine::Recalculate() {
         return;
     }
 
-    partitions.reset();
-    partitionCount = 0;
     int lines = 0;
     if (mode == 0) {
         lines = 16;

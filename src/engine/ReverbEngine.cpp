@@ -4,6 +4,7 @@
 #include <cmath>
 #include <initializer_list>
 #include <iterator>
+#include <new>
 
 namespace ulvetta {
 
@@ -23,9 +24,7 @@ ReverbEngine::ReverbEngine() {
 }
 
 ReverbEngine::~ReverbEngine() {
-    // Workers are joined before any buffer they use goes.
-    StopWorkers();
-    partitions.reset();
+    response_.reset();
     nspFirFree(&firLeft);
     nspFirFree(&firRight);
 }
@@ -144,6 +143,9 @@ void ReverbEngine::UpdateNotch() {
 }
 
 void ReverbEngine::SetSampleRate(int rate) {
+    // No host gives a rate outside 1..768000 Hz; the lengths and designs derived from one would not be
+    // meaningful (or not finite), so such a rate is ignored.
+    if (rate < 1 || rate > kMaxSampleRate) return;
     if (rate != sampleRate) {
         // Lengths and designs made for the old rate must be derived again by the setters that follow.
         preDelay = -1;
@@ -162,28 +164,94 @@ void ReverbEngine::SetSampleRate(int rate) {
     smoothCoefs[4] = static_cast<float>((1.0 - alpha) * n);
 }
 
+bool ReverbEngine::PreparedResponse(std::vector<float>& left, std::vector<float>& right) const {
+    if (!IsConvolution(mode) || !response_) return false;
+    left.assign(response_->irLeft.get(), response_->irLeft.get() + response_->irLength);
+    right.assign(response_->irRight.get(), response_->irRight.get() + response_->irLength);
+    return true;
+}
+
 void ReverbEngine::ClearEndOfStream() {
     flushLatched = false;
     tailTrimArmed = false;
 }
 
 void ReverbEngine::ResetState() {
-    Recalculate();
+    // The convolution restarts with the response for the settings, ready before this returns: a stream
+    // begins with the sound it was set up for.
+    if (IsConvolution(mode) && roomSize != -1)
+        CommitResponse(false);
+    else
+        Recalculate();
     tailTrimArmed = false;
     flushLatched = false;
     convCounter = 0;
     std::fill(std::begin(smoothState), std::end(smoothState), 0.0f);
     for (DelayLine& l : delayLines) l.Zero();
     for (DelayLine& l : earlyLines) l.Zero();
-    historyLeft.Zero();
-    historyRight.Zero();
-    for (int32_t i = 1; i < partitionCount && partitions; ++i) {
-        ConvPartition& p = partitions[i];
-        std::fill(p.inputLeft.get(), p.inputLeft.get() + 2 * p.size, 0.0f);
-        std::fill(p.inputRight.get(), p.inputRight.get() + 2 * p.size, 0.0f);
-    }
+    if (response_) response_->Clear();
     nspsFirSetDlyl(nullptr, &firLeft);
     nspsFirSetDlyl(nullptr, &firRight);
+    headLeft = headRight = 0.0f;
+}
+
+void ReverbEngine::EndChanges() {
+    if (batchDepth_ > 0 && --batchDepth_ == 0 && responseStale_) {
+        // Called as the core's lock guard goes, so nothing may escape: a preparation that cannot allocate
+        // leaves the response as it was, and the next change of its settings or stream start prepares again.
+        try {
+            CommitResponse(true);
+        } catch (const std::bad_alloc&) {
+        }
+    }
+}
+
+void ReverbEngine::CommitResponse(bool mayDefer) {
+    responseStale_ = false;
+    if (!IsConvolution(mode) || roomSize == -1) return;
+    const ResponseKey wanted = WantedResponse();
+    if (response_ && response_->key == wanted) {
+        preparer_.Drop();  // anything on its way was made for settings that no longer hold
+        return;
+    }
+    ++rebuildCount;
+    if (mayDefer && asyncPreparation_ && preparer_.Request(wanted, !inlineLargePartitions)) return;
+    InstallResponse(preparer_.Prepare(wanted, !inlineLargePartitions));
+}
+
+void ReverbEngine::InstallResponse(std::unique_ptr<ConvolutionResponse> r) {
+    std::swap(response_, r);
+    preparer_.Discard(std::move(r));
+    StartResponse();
+}
+
+void ReverbEngine::StartResponse() {
+    nspsFirSetDlyl(nullptr, &firLeft);
+    nspsFirSetDlyl(nullptr, &firRight);
+    nspsFirSetTaps(response_->irLeft.get(), &firLeft);
+    nspsFirSetTaps(response_->irRight.get(), &firRight);
+    headLeft = headRight = 0.0f;
+    convCounter = 0;
+}
+
+void ReverbEngine::DropResponse() {
+    preparer_.Drop();
+    preparer_.Discard(std::move(response_));
+}
+
+void ReverbEngine::SilenceNetworks() {
+    for (DelayLine& l : delayLines) l.Zero();
+    for (DelayLine& l : earlyLines) l.Zero();
+    if (preDelayLine.samples) std::fill(preDelayLine.samples.get(), preDelayLine.samples.get() + preDelayLine.length, 0.0);
+    for (BiquadSection& s : filterSections) s.x1L = s.x2L = s.y1L = s.y2L = s.x1R = s.x2R = s.y1R = s.y2R = 0.0;
+    colourState = colourState2 = dampingStateLeft = dampingStateRight = 0.0;
+    std::fill(std::begin(smoothState), std::end(smoothState), 0.0f);
+    if (response_) response_->Clear();
+    nspsFirSetDlyl(nullptr, &firLeft);
+    nspsFirSetDlyl(nullptr, &firRight);
+    headLeft = headRight = 0.0f;
+    std::fill(std::begin(partSumLeft), std::end(partSumLeft), 0.0);
+    std::fill(std::begin(partSumRight), std::end(partSumRight), 0.0);
 }
 
 }  // namespace ulvetta

@@ -5,6 +5,11 @@
 // own. Lifecycle vocabulary: the setters, Recalculate and ResetState may allocate (network sizing);
 // ProcessBlock never allocates except to grow the mono scratch buffer to a larger block than any before.
 //
+// The convolution response is prepared once per change: within BeginChanges/EndChanges the setters only
+// mark it stale and EndChanges prepares it. While streaming it is prepared on the preparer's thread and
+// switched in at the start of a block (the response played until then stays in use); otherwise, and
+// always in ResetState, on the calling thread before it returns.
+//
 // Values that arrive through setters start outside their ranges (-1, -1.0, -100000.0): the first setting
 // of each always counts as a change, and rebuilds do nothing while a value they need is still unset.
 #pragma once
@@ -13,8 +18,9 @@
 #include <memory>
 #include <vector>
 
+#include "engine/ConvolutionResponse.h"
+#include "engine/ResponsePreparer.h"
 #include "processing/BiquadSection.h"
-#include "processing/ConvPartition.h"
 #include "processing/DelayLine.h"
 #include "spectral/Nsp.h"
 
@@ -40,8 +46,12 @@ struct BlockPolicy {
     bool flushNetworkStates;  // colour and damping states cleaned after the block
 };
 
+// The convolution modes (3, 4 and 5) play a prepared response; the others run delay networks.
+inline bool IsConvolution(int32_t mode) { return mode >= 3 && mode <= 5; }
+
 class ReverbEngine {
 public:
+    static constexpr int32_t kMaxSampleRate = 768000;  // Hz; the highest rate a host may give
     static constexpr int kNetworkLines = 24;
     static constexpr int kEarlyLines = 6;
     static constexpr int kOutputTaps = 20;
@@ -71,7 +81,8 @@ public:
     void SetNotchQ(double q);
     void SetMode(int m);
 
-    // Stores the stream rate and designs the meter smoother. A rate other than the one held also marks
+    // Stores the stream rate and designs the meter smoother; a rate outside 1..kMaxSampleRate is ignored.
+    // A rate other than the one held also marks
     // "Pre Delay" and "Notch Freq" unset, so the setters that follow derive them again for the new rate.
     void SetSampleRate(int rate);
     // Rebuilds the network of the current mode (allocates).
@@ -80,12 +91,15 @@ public:
     void UpdateNotch();
     // Rebuilds and silences the engine at stream start.
     void ResetState();
-    // Prepares a stored response (frames interleaved stereo frames at 44100 Hz) for the convolution modes:
-    // rate conversion, shortening, damping, fade, room envelope, partitions with their spectra and workers,
-    // the FIR head and the history rings (allocates).
-    void PrepareImpulse(int frames, const float* table);
-    // Stops the worker of every partition (before anything they use is freed or rebuilt).
-    void StopWorkers();
+    // Brackets a group of setter calls: the convolution response they make stale is prepared once, by the
+    // outermost EndChanges (nestable).
+    void BeginChanges() { ++batchDepth_; }
+    void EndChanges();
+    // While streaming, responses are prepared off the calling thread and switched in by a later block.
+    void SetStreaming(bool on) { asyncPreparation_ = on; }
+    // Waits until no response is being prepared off the calling thread; the next block switches in what
+    // was prepared. For tests and hosts that render offline.
+    void WaitForPreparation() { preparer_.WaitIdle(); }
     // Forgets that the stream had ended (the flush latch and the tail trimming), keeping the sound: a
     // seek after the end of a stream plays on without its blocks being trimmed.
     void ClearEndOfStream();
@@ -100,15 +114,12 @@ public:
     // The level meter's source: 0 input, 1 output, 2 wet.
     void SetMeterSource(int source) { meterSource = source; }
     // Records of the prepared convolution response, the direct head included (0 when none is prepared).
-    int32_t PartitionCount() const { return partitionCount; }
+    int32_t PartitionCount() const { return response_ ? response_->partitionCount : 0; }
     // Copies the prepared convolution response (one vector per channel, at the stream rate); false when the
     // current mode is not a convolution or no response is prepared. Allocates.
     bool PreparedResponse(std::vector<float>& left, std::vector<float>& right) const;
 
 private:
-    // The prepared response, irLength samples per channel.
-    std::unique_ptr<float[]> irLeft, irRight;
-    int32_t irLength = 0;
     friend class EngineProbe;  // the tests' read access
     // The kernels' shared pieces outside the class (engine/kernels/PlateNetwork.h).
     friend struct PlateInput;
@@ -159,21 +170,37 @@ private:
     float smoothCoefs[5] = {0, 0, 0, 0, 0};  // b0, b1, b2, a1, a2
     float smoothState[4] = {0, 0, 0, 0};     // x1, x2, y1, y2
     int32_t meterSource = 0;                 // 0 input, 1 output, 2 wet
-    HistoryRing historyLeft, historyRight;       // the convolution's input history
     float headLeft = 0.0f, headRight = 0.0f;     // latest outputs of the direct FIR head
     double partSumLeft[32] = {}, partSumRight[32] = {};  // the partitions' output for the current 32 frames
     FirState firLeft, firRight;                  // the response's first 64 samples, applied directly
-    int32_t partitionCount = 0;                  // records in partitions, the head (record 0) included
     int32_t convCounter = 0;
     int32_t tailCountdown = 0;  // frames of convolution tail still owed after the first flush block
     // Run the jobs of large partitions on the streaming thread instead of their workers (for tests;
     // the output is the same).
     bool inlineLargePartitions = false;
-    // Declared after the buffers it reads: destroyed (and its workers joined) first.
-    std::unique_ptr<ConvPartition[]> partitions;
+    // The convolution response being played (null when none is prepared), and its preparation.
+    std::unique_ptr<ConvolutionResponse> response_;
+    ResponsePreparer preparer_;
+    bool asyncPreparation_ = false;
+    int32_t batchDepth_ = 0;
+    bool responseStale_ = false;  // a setter changed what the response depends on, inside a batch
 
     // Number of rebuilds that got past the unset-value guard (for tests and diagnostics).
     int32_t rebuildCount = 0;
+
+    // The settings the current mode's response depends on.
+    ResponseKey WantedResponse() const { return {mode, sampleRate, decay, damping, roomSize}; }
+    // Brings the response up to date with the settings: on this thread, or (when allowed and streaming)
+    // by a request to the preparer.
+    void CommitResponse(bool mayDefer);
+    // Starts playing a freshly prepared response: its direct head, a silent history, the counter at 0.
+    void InstallResponse(std::unique_ptr<ConvolutionResponse> r);
+    // The part of installing that the streaming thread does when it switches a response in (no allocation).
+    void StartResponse();
+    // Forgets the response and anything being prepared (a delay-network mode is selected).
+    void DropResponse();
+    // Zeroes every state the networks and the convolution recirculate, after a non-finite value got in.
+    void SilenceNetworks();
 
     // The highest frequency a filter design receives: just under half the rate, so that a section
     // stays stable at any rate while the parameter keeps the value the user set.
@@ -263,6 +290,8 @@ private:
 
     // Running peak of the wet or output meter within the current block.
     float meterPeak_ = 0.0f;
+    // A mixed sample of the current block was not finite: the networks are silenced after the block.
+    bool poisoned_ = false;
 };
 
 }  // namespace ulvetta

@@ -21,15 +21,36 @@ double levelGain(int32_t id, int32_t value) {
 
 }  // namespace
 
+namespace {
+// Its address marks the thread that holds a core's lock.
+thread_local char threadMark;
+}  // namespace
+
 ReverbCore::Guard::Guard(ReverbCore& core) : core_(core) {
-    core_.lock_.lock();
-    ++core_.lockDepth_;
+    const void* self = &threadMark;
+    if (core_.owner_.load(std::memory_order_relaxed) == self) {
+        core_.lock_.lock();  // nested in an operation of this thread
+    } else {
+        // One waiter at a time waits for the lock itself, holding the turnstile: a thread that has just
+        // released the lock queues at the turnstile behind it instead of taking the lock again first.
+        core_.turnstile_.lock();
+        core_.lock_.lock();
+        core_.turnstile_.unlock();
+    }
+    if (core_.lockDepth_++ == 0) {
+        core_.owner_.store(self, std::memory_order_relaxed);
+        core_.engine_.BeginChanges();
+    }
 }
 
 ReverbCore::Guard::~Guard() {
-    if (--core_.lockDepth_ == 0 && !core_.pendingReports_.empty()) {
-        core_.deliverCaptureReports();
-        return;
+    if (core_.lockDepth_ == 1) core_.engine_.EndChanges();  // prepares what the changes made stale
+    if (--core_.lockDepth_ == 0) {
+        core_.owner_.store(nullptr, std::memory_order_relaxed);
+        if (!core_.pendingReports_.empty()) {
+            core_.deliverCaptureReports();
+            return;
+        }
     }
     core_.lock_.unlock();
 }
@@ -211,7 +232,8 @@ bool ReverbCore::setValueAndNotify(int32_t id, int32_t value) {
 
 void ReverbCore::setFormat(float sampleRate, int32_t, int32_t, int32_t) {
     Guard g(*this);
-    sampleRate_ = sampleRate;
+    const double rounded = std::round(static_cast<double>(sampleRate));  // NaN fails both tests
+    if (rounded >= 1.0 && rounded <= ReverbEngine::kMaxSampleRate) sampleRate_ = sampleRate;
 }
 
 int32_t ReverbCore::processStereo(const float* inLeft, const float* inRight, float* outLeft, float* outRight,
@@ -261,6 +283,7 @@ bool ReverbCore::startStreaming() {
     if (!applied_) applyAll();
     stopped_ = false;
     engine_.ResetState();
+    engine_.SetStreaming(true);
     return true;
 }
 
@@ -272,6 +295,7 @@ void ReverbCore::resumeAfterFlush() {
 void ReverbCore::stopStreaming() {
     Guard g(*this);
     stopped_ = true;
+    engine_.SetStreaming(false);
 }
 
 int32_t ReverbCore::stateSize() { return kCoreStateSize; }

@@ -5,7 +5,10 @@
 // through these operations.
 //
 // Threads: each operation's tag says who may call it, which lock it takes and whether it may allocate.
-// The lock is re-entrant because operations call one another under it. Listener refreshes and a
+// The lock is re-entrant because operations call one another under it. Threads take it in turns: the
+// streaming thread and a thread changing parameters as fast as it can alternate, so neither waits for more
+// than the other's operation in progress and the next one queued. A parameter change holds the lock briefly: while streaming, a convolution response is prepared on the engine's preparation thread
+// and switched in by a later block; otherwise it is prepared once, when the outermost operation ends. Listener refreshes and a
 // CoreHost other than the core itself run with the lock held, so they must not wait for a thread that
 // needs it. Capture reports are made after the outermost lock is released, in the order of the changes.
 // "May allocate": applying a parameter that rebuilds the engine's networks (Algorithm, Room Size, Pre
@@ -13,6 +16,7 @@
 // to grow its scratch to a larger block than any before.
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <vector>
 
@@ -109,8 +113,9 @@ public:
     virtual void removeListener(CoreListener* l);
     // [any thread] locks core; may allocate. setValue, then notifyHost with the value's position.
     virtual bool setValueAndNotify(int32_t id, int32_t value);
-    // [any thread] locks core; never allocates. Stores the sample rate for the next apply; the other
-    // arguments are accepted for the callers' sake and not used.
+    // [any thread] locks core; never allocates. Stores the sample rate for the next apply when it rounds
+    // to 1..768000 Hz (any other is ignored); the other arguments are accepted for the callers' sake and
+    // not used.
     virtual void setFormat(float sampleRate, int32_t reserved, int32_t inChannels, int32_t outChannels);
 
     // Processing. processStereo returns the number of output frames that carry signal: frames for an
@@ -133,7 +138,9 @@ public:
     virtual bool applyAll();
     // [any thread] locks core; never allocates.
     virtual void resetLevel();
-    // [graph thread] locks core; may allocate (the first apply and the engine's reset).
+    // [graph thread] locks core; may allocate (the first apply and the engine's reset). Returns once the
+    // convolution response for the settings is prepared; from then until stopStreaming responses are
+    // prepared off the calling threads.
     virtual bool startStreaming();
     // [graph thread] locks core; never allocates.
     virtual void stopStreaming();
@@ -170,6 +177,11 @@ public:
     // Any thread; takes the core's lock (a block waits for the copy); allocates the two vectors.
     bool preparedResponse(std::vector<float>& left, std::vector<float>& right);
 
+    // [any thread but the streaming one] no lock; never allocates. Waits until no convolution response is
+    // being prepared off the calling threads; the next block plays what was prepared. For offline hosts
+    // that change settings while rendering, and for tests.
+    void waitForPreparation() { engine_.WaitForPreparation(); }
+
     // The engine for tests (through EngineProbe) and diagnostics; use it only while nothing else uses the
     // core.
     const ReverbEngine& engineForInspection() const { return engine_; }
@@ -181,7 +193,8 @@ private:
         int32_t id;
         float position;
     };
-    // Holds the core's lock; the outermost guard delivers the queued capture reports after unlocking.
+    // Holds the core's lock, taken in turns (see the header); the outermost guard brackets the engine's
+    // changes and delivers the queued capture reports after unlocking.
     class Guard {
     public:
         explicit Guard(ReverbCore& core);
@@ -199,6 +212,8 @@ private:
     void deliverCaptureReports();
 
     Mutex lock_;
+    Mutex turnstile_;                          // held by the one thread waiting for lock_
+    std::atomic<const void*> owner_{nullptr};  // a mark of the thread holding lock_, or null
     int lockDepth_ = 0;  // guards held by the locking thread
     std::vector<CaptureReport> pendingReports_;
     std::vector<CoreListener*> listeners_;

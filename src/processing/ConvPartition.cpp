@@ -35,8 +35,13 @@ void ConvPartition::Allocate(int32_t s, int32_t o) {
     size = s;
     fftOrder = o;
     for (auto* p : {&inputLeft, &inputRight}) p->reset(new float[2 * static_cast<size_t>(s)]());
-    for (auto* p : {&workLeft, &workRight, &spectrumLeft, &spectrumRight})
-        p->reset(new float[4 * static_cast<size_t>(s)]());
+    // The transforms write the work space before they read it, and use the first half of it and of the
+    // spectrum buffer; only that half of the spectrum is zeroed (its segment is copied in later).
+    for (auto* p : {&workLeft, &workRight}) p->reset(new float[4 * static_cast<size_t>(s)]);
+    for (auto* p : {&spectrumLeft, &spectrumRight}) {
+        p->reset(new float[4 * static_cast<size_t>(s)]);
+        std::fill(p->get(), p->get() + 2 * static_cast<size_t>(s), 0.0f);
+    }
     for (auto* p : {&outputLeft, &outputRight, &nextLeft, &nextRight}) p->reset(new float[s]());
 }
 
@@ -52,6 +57,15 @@ void ConvPartition::RunJob() {
         // The segment sits in the second half of its block, so these values have no wrap-around terms.
         std::memcpy(nexts[c], works[c], sizeof(float) * size);
     }
+}
+
+void ConvPartition::Clear() {
+    const bool worker = HasWorker();
+    if (worker) WaitDone();
+    for (auto* p : {&inputLeft, &inputRight}) std::fill(p->get(), p->get() + 2 * static_cast<size_t>(size), 0.0f);
+    for (auto* p : {&outputLeft, &outputRight, &nextLeft, &nextRight}) std::fill(p->get(), p->get() + size, 0.0f);
+    readPos = 0;
+    if (worker) doneEvent_->set();  // the next hand-off finds the worker idle, as after its start
 }
 
 bool ConvPartition::StartWorker(std::size_t stackBytes) {

@@ -52,11 +52,15 @@ struct ConvPartition {
     ConvPartition(const ConvPartition&) = delete;
     ConvPartition& operator=(const ConvPartition&) = delete;
 
-    // Allocates the buffers of a partition of s samples and transform order o (zeroed, spectra empty).
+    // Allocates the buffers of a partition of s samples and transform order o: window and results zeroed,
+    // the first half of each spectrum zeroed (the segment goes into it), the work space left unset.
     void Allocate(int32_t s, int32_t o);
     // Transforms the window and multiplies by the segment's spectrum; the first size values of the inverse
     // become the next result (both channels).
     void RunJob();
+    // Zeroes the window, the results and the play position, keeping the spectra; first waits for a job the
+    // worker still runs. Allocates nothing.
+    void Clear();
 
     // Starts the worker with its two events; it signals doneEvent once at start.
     bool StartWorker(std::size_t stackBytes);

@@ -1,6 +1,6 @@
 // The convolution reverbs: the prepared response against the stored one (shortening, fade, damping, room
-// envelope), the core's copy of it, the kernel against a direct convolution, workers
-// against inline jobs, the exact tail, settings changed while another thread streams, repeated preparation.
+// envelope), the kernel against a direct convolution, workers against inline jobs, the exact tail, settings
+// of every algorithm changed while another thread streams, repeated preparation.
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -69,22 +69,6 @@ TEST(ImpulsePreparation, DampingAndRoomEnvelope) {
     test::Started low(8000, Convolution(4, 100, 99));
     const EngineProbe p(low);
     for (int i = 0; i < p.responseLength(); ++i) ASSERT_LT(std::fabs(p.responseLeft()[i]), 1.0f) << i;
-}
-
-// The core copies out the response its engine prepared, and nothing for a delay-network algorithm.
-TEST(ConvolutionKernel, CoreHandsOutThePreparedResponse) {
-    ReverbCore core;
-    std::vector<float> left, right;
-    EXPECT_FALSE(core.preparedResponse(left, right));  // nothing applied yet
-    core.setValue(kAlgorithm, 1);
-    core.applyAll();
-    EXPECT_FALSE(core.preparedResponse(left, right));
-    core.setValue(kAlgorithm, 4);
-    ASSERT_TRUE(core.preparedResponse(left, right));
-    const EngineProbe p(core.engineForInspection());
-    ASSERT_EQ(left.size(), static_cast<size_t>(p.responseLength()));
-    EXPECT_TRUE(std::equal(left.begin(), left.end(), p.responseLeft()));
-    EXPECT_TRUE(std::equal(right.begin(), right.end(), p.responseRight()));
 }
 
 // Left-only noise gives a direct convolution with the left response, at the wet level, whatever the block

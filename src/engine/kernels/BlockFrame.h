@@ -11,9 +11,15 @@
 
 namespace ulvetta {
 
-// A non-finite input sample (from a faulty upstream source) is taken as silence, so that it can never
-// poison the recirculating state or the mix.
-ULVETTA_ALWAYS_INLINE float finiteOrZero(float v) { return std::isfinite(v) ? v : 0.0f; }
+// An input sample as the networks take it: a non-finite one (from a faulty upstream source) as silence,
+// and one beyond +/-2^20 (120 dB over full scale, as from a float file read with the wrong byte order)
+// limited to that, so that no sum or gain of the input stage can overflow and poison the recirculating
+// state. Audio within that range passes unchanged.
+constexpr float kInputLimit = 1048576.0f;
+ULVETTA_ALWAYS_INLINE float saneInput(float v) {
+    if (!std::isfinite(v)) return 0.0f;
+    return v > kInputLimit ? kInputLimit : (v < -kInputLimit ? -kInputLimit : v);
+}
 
 // A mixed output sample as float. A result below the smallest normal float (-759 dB) becomes an exact
 // zero instead of a denormal: a decaying tail otherwise sends denormal floats through the conversion, the
@@ -40,8 +46,17 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::mixOutput(float* outLeft, float* outRig
                                                    const float* inRight, int frame, int stride, int accumulate,
                                                    double wetLeft, double wetRight, double wet, double dry) {
     const int at = frame * stride;
-    const float l = toOutputFloat(wetLeft * wet + finiteOrZero(inLeft[at]) * dry);
-    const float r = toOutputFloat(wetRight * wet + finiteOrZero(inRight[at]) * dry);
+    const float dryLeft = saneInput(inLeft[at]), dryRight = saneInput(inRight[at]);
+    float l = toOutputFloat(wetLeft * wet + dryLeft * dry);
+    float r = toOutputFloat(wetRight * wet + dryRight * dry);
+    if (!std::isfinite(l) || !std::isfinite(r)) {
+        // The network's state is no longer finite: this frame gets the dry signal alone, and the block
+        // driver silences the networks after the block.
+        poisoned_ = true;
+        wetLeft = wetRight = 0.0;
+        l = toOutputFloat(dryLeft * dry);
+        r = toOutputFloat(dryRight * dry);
+    }
     if (accumulate) {
         outLeft[at] += l;
         outRight[at] += r;
@@ -63,9 +78,8 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::makeStereo(const float* inLeft, const f
     float* scratch = growScratch(2 * frames);
     const float gain = static_cast<float>(inputGain);
     for (int i = 0; i < frames; ++i) {
-        const float l = inLeft[i * stride], r = inRight[i * stride];
-        scratch[2 * i] = (std::isfinite(l) ? l : 0.0f) * gain;
-        scratch[2 * i + 1] = (std::isfinite(r) ? r : 0.0f) * gain;
+        scratch[2 * i] = saneInput(inLeft[i * stride]) * gain;
+        scratch[2 * i + 1] = saneInput(inRight[i * stride]) * gain;
     }
 }
 
@@ -89,6 +103,10 @@ ULVETTA_ALWAYS_INLINE int ReverbEngine::RunBlock(float* outLeft, float* outRight
     }
     startMeter();
     (this->*kFrames)(outLeft, outRight, inLeft, inRight, frames, stride, accumulate);
+    if (poisoned_) {
+        poisoned_ = false;
+        SilenceNetworks();
+    }
     finishMeter();
     if (kPolicy.flushNetworkStates) flushKernelStates();
     if (kPolicy.end == EndOfStream::ResponseLength) return countedLength(frames, flush);

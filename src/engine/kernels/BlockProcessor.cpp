@@ -37,7 +37,7 @@ void ReverbEngine::latchEndOfStream(int flush, EndOfStream rule) {
         // The tail is the response's length after the last input frame, counted from the first flush block.
         if (flush && !flushLatched) {
             flushLatched = true;
-            tailCountdown = std::max(0, irLength - 1);
+            tailCountdown = response_ ? std::max(0, response_->irLength - 1) : 0;
         }
         return;
     }
@@ -69,8 +69,8 @@ void ReverbEngine::meterInput(const float* inLeft, const float* inRight, int fra
     const float gain = static_cast<float>(inputGain);
     float peak = 0.0f;
     for (int i = 0; i < frames; ++i) {
-        const float l = finiteOrZero(inLeft[i * stride]);
-        const float r = finiteOrZero(inRight[i * stride]);
+        const float l = saneInput(inLeft[i * stride]);
+        const float r = saneInput(inRight[i * stride]);
         peak = std::max(peak, smooth(std::max(std::fabs(l), std::fabs(r)) * gain));
     }
     raiseLevel(peak);
@@ -91,8 +91,8 @@ void ReverbEngine::makeMono(const float* inLeft, const float* inRight, int frame
     float* mono = growScratch(frames);
     const float gain = static_cast<float>(inputGain);
     for (int i = 0; i < frames; ++i) {
-        const float l = finiteOrZero(inLeft[i * stride]);
-        const float r = finiteOrZero(inRight[i * stride]);
+        const float l = saneInput(inLeft[i * stride]);
+        const float r = saneInput(inRight[i * stride]);
         mono[i] = (l + r) * 0.5f * gain;
     }
 }

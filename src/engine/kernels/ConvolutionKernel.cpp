@@ -32,6 +32,8 @@ constexpr BlockPolicy kConvolutionBlock = {true, EndOfStream::ResponseLength, In
 
 int ReverbEngine::processConvolution(float* outLeft, float* outRight, const float* inLeft, const float* inRight,
                                      int frames, int stride, int accumulate, int flush) {
+    // A response prepared off this thread starts at this block boundary.
+    if (preparer_.TakeReady(response_)) StartResponse();
     return RunBlock<kConvolutionBlock, &ReverbEngine::convolutionFrames>(outLeft, outRight, inLeft, inRight, frames,
                                                                         stride, accumulate, flush);
 }
@@ -39,13 +41,14 @@ int ReverbEngine::processConvolution(float* outLeft, float* outRight, const floa
 ULVETTA_ALWAYS_INLINE void ReverbEngine::convolutionFrames(float* outLeft, float* outRight, const float* inLeft,
                                                            const float* inRight, int frames, int stride,
                                                            int accumulate) {
-    const bool ready = partitions != nullptr && irLeft != nullptr && historyLeft.count > 0;
+    const bool ready = response_ != nullptr;
+    ConvolutionResponse* r = response_.get();
     for (int i = 0; i < frames; ++i) {
         const int at = i * stride;
         double wetLeft = 0.0, wetRight = 0.0;
         if (ready) {
             // 1-3. Gain, the input sections and the colour low-pass, one state run over left then right.
-            double xl = finiteOrZero(inLeft[at]) * inputGain, xr = finiteOrZero(inRight[at]) * inputGain;
+            double xl = saneInput(inLeft[at]) * inputGain, xr = saneInput(inRight[at]) * inputGain;
             for (int s = 0; s < 3; ++s) xl = sectionStep(filterSections[s], xl);
             for (int s = 0; s < 3; ++s) xr = sectionStep(filterSections[s], xr);
             double cl = xl, cr = xr;
@@ -55,8 +58,8 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::convolutionFrames(float* outLeft, float
                 colourState = cr;
             }
             // 4-5. History and the direct head.
-            historyLeft.Push(static_cast<float>(cl));
-            historyRight.Push(static_cast<float>(cr));
+            r->historyLeft.Push(static_cast<float>(cl));
+            r->historyRight.Push(static_cast<float>(cr));
             headLeft = nspsFir(&firLeft, static_cast<float>(cl));
             headRight = nspsFir(&firRight, static_cast<float>(cr));
             // 6. Every 32 frames: the partitions due take a new window and hand over their last result,
@@ -66,8 +69,8 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::convolutionFrames(float* outLeft, float
             const int32_t slot = n % 32;
             if (slot == 0) {
                 if (n != 0) {
-                    for (int32_t k = 1; k < partitionCount; ++k) {
-                        ConvPartition& p = partitions[k];
+                    for (int32_t k = 1; k < r->partitionCount; ++k) {
+                        ConvPartition& p = r->partitions[k];
                         if ((n / 32) % (p.size / 32) != 0 || p.offset > n) continue;
                         const bool worker = p.size >= kWorkerPartition && p.HasWorker();
                         if (worker) p.WaitDone();
@@ -78,8 +81,8 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::convolutionFrames(float* outLeft, float
                         std::copy(p.inputLeft.get() + N, p.inputLeft.get() + 2 * N, p.inputLeft.get());
                         std::copy(p.inputRight.get() + N, p.inputRight.get() + 2 * N, p.inputRight.get());
                         // Frames n - offset .. n - offset + N - 1, oldest first; frame n is the newest.
-                        historyLeft.CopyOut(p.offset, N, p.inputLeft.get() + N);
-                        historyRight.CopyOut(p.offset, N, p.inputRight.get() + N);
+                        r->historyLeft.CopyOut(p.offset, N, p.inputLeft.get() + N);
+                        r->historyRight.CopyOut(p.offset, N, p.inputRight.get() + N);
                         if (worker)
                             p.StartJob();
                         else
@@ -88,8 +91,8 @@ ULVETTA_ALWAYS_INLINE void ReverbEngine::convolutionFrames(float* outLeft, float
                 }
                 std::fill(std::begin(partSumLeft), std::end(partSumLeft), 0.0);
                 std::fill(std::begin(partSumRight), std::end(partSumRight), 0.0);
-                for (int32_t k = 1; k < partitionCount; ++k) {
-                    ConvPartition& p = partitions[k];
+                for (int32_t k = 1; k < r->partitionCount; ++k) {
+                    ConvPartition& p = r->partitions[k];
                     const float* ol = p.outputLeft.get() + p.readPos;
                     const float* orr = p.outputRight.get() + p.readPos;
                     for (int j = 0; j < 32; ++j) {
