@@ -47,6 +47,9 @@ class Plugin {
       if (fresh && core_->saveState(record.data()) && fresh->loadState(record.data(), 88)) core_ = std::move(fresh);
       ran_ = false;
     }
+    // Ports the host has already connected are applied before the stream starts, so their response is
+    // prepared here rather than on the preparation thread while the first blocks play without it.
+    applyPorts();
     core_->startStreaming();
     active_ = true;
   }

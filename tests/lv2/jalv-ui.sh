@@ -22,9 +22,10 @@ fail() {
   [ -f "$work/jalv.log" ] && tail -n 20 "$work/jalv.log" >&2
   exit 1
 }
-# Waits up to 10 s for a command to succeed.
+# Waits up to 60 s for a command to succeed (a loaded machine can be slow to start a GTK program; nothing here
+# waits the whole time when things work).
 await() {
-  for _ in $(seq 100); do
+  for _ in $(seq 600); do
     if "$@" >/dev/null 2>&1; then return 0; fi
     sleep 0.1
   done
@@ -67,10 +68,14 @@ from PIL import Image, ImageChops, ImageGrab
 x, y = int(sys.argv[1]), int(sys.argv[2])
 shown = ImageGrab.grab(xdisplay=None).crop((x, y, x + 750, y + 167)).convert("RGB")
 expected = Image.open(sys.argv[3]).convert("RGB")
-sys.exit(0 if ImageChops.difference(shown, expected).getbbox() is None else 1)
+box = ImageChops.difference(shown, expected).getbbox()
+if box is not None:
+    print("differs in", box, file=sys.stderr)
+sys.exit(0 if box is None else 1)
 PY
 }
-await compare || fail "the editor in jalv differs from ulvetta snapshot of the same settings"
+await compare 2>"$work/compare.log" ||
+  fail "the editor in jalv differs from ulvetta snapshot of the same settings ($(tail -n 1 "$work/compare.log"))"
 
 if [ -n "$picture" ]; then
   "$python" -c "from PIL import ImageGrab; ImageGrab.grab(xdisplay=None).crop((0, 0, 750, $((y + 167)))).save('$picture')"
