@@ -180,6 +180,33 @@ inline void PressKey(WORD vk) {
   SendInput(2, in, sizeof(INPUT));
 }
 
+// Real typing of digits, "." and "-".
+inline void Type(const std::string& text) {
+  for (char c : text) PressKey(c == '.' ? VK_OEM_PERIOD : c == '-' ? VK_OEM_MINUS : static_cast<WORD>(c));
+}
+
+// True when window or one of its children shows text.
+inline bool ShowsText(HWND window, const std::wstring& text) {
+  wchar_t own[256] = {};
+  GetWindowTextW(window, own, 256);
+  if (text == own) return true;
+  struct Search {
+    const std::wstring* text;
+    bool found;
+  } search{&text, false};
+  EnumChildWindows(
+      window,
+      [](HWND w, LPARAM p) -> BOOL {
+        auto* s = reinterpret_cast<Search*>(p);
+        wchar_t t[256] = {};
+        GetWindowTextW(w, t, 256);
+        s->found = s->found || *s->text == t;
+        return !s->found;
+      },
+      reinterpret_cast<LPARAM>(&search));
+  return search.found;
+}
+
 // Mouse messages straight to the page window, in its client coordinates; each is handled when the call returns.
 inline void Mouse(HWND page, UINT message, int x, int y, WPARAM buttons) {
   SendMessageW(page, message, buttons, MAKELPARAM(x, y));

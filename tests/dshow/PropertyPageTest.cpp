@@ -61,7 +61,7 @@ int SettledDifferences(HWND page, const std::string& rgbFile, RECT exclude = {0,
   return d;
 }
 
-[[maybe_unused]] std::vector<uint8_t> StateOf(FilterHolder& f) {
+std::vector<uint8_t> StateOf(FilterHolder& f) {
   std::vector<uint8_t> state(kCoreStateSize);
   f.Core()->saveState(state.data());
   return state;
@@ -107,4 +107,40 @@ TEST_F(PageTest, TheFrameShowsTheWholeEditorAsTheSnapshotDrawsIt) {
   EXPECT_EQ(SettledDifferences(frame.page(), "about.rgb", RECT{399, 17, 751, 120}), 0);
   frame.close();
   EXPECT_EQ(frame.result(), S_OK);
+}
+
+TEST_F(PageTest, MouseAndKeysChangeTheSettingsAsOnLinux) {
+  FrameSession frame(filter.inner);
+  ASSERT_NE(frame.page(), nullptr);
+  const HWND page = frame.page();
+  const std::vector<uint8_t> initial = StateOf(filter);
+
+  // The Pre Delay fader: a click on its track, then a drag of its thumb, as drag.events plays them.
+  Click(page, 284, 120);
+  Mouse(page, WM_LBUTTONDOWN, 284, 120, MK_LBUTTON);
+  Mouse(page, WM_MOUSEMOVE, 284, 60, MK_LBUTTON);
+  Mouse(page, WM_MOUSEMOVE, 284, 70, MK_LBUTTON);
+  Mouse(page, WM_LBUTTONUP, 284, 70, 0);
+  const std::vector<uint8_t> dragged = ReadFile(kCases + "/drag.stp");
+  EXPECT_NE(dragged, initial);
+  EXPECT_EQ(StateOf(filter), dragged);
+  EXPECT_EQ(GetCapture(), nullptr);
+
+  // Keys come from the keyboard through the frame's dialog manager, which would take TAB for itself.
+  SetForegroundWindow(frame.frame());
+  ASSERT_TRUE(WaitFor([&] { return GetForegroundWindow() == frame.frame(); }, 2000));
+  PressKey(VK_TAB);
+  EXPECT_TRUE(WaitFor([&] { return frame.editor()->currentPage() == kFilterPage; }, 2000));
+  PressKey(VK_TAB);
+  EXPECT_TRUE(WaitFor([&] { return frame.editor()->currentPage() == kReverbPage; }, 2000));
+
+  // The Decay value typed and stored with Enter, from the default settings, as typed.events does it.
+  filter.Core()->loadState(initial.data(), kCoreStateSize);
+  const std::vector<uint8_t> typed = ReadFile(kCases + "/typed.stp");
+  ASSERT_NE(typed, initial);
+  Click(page, 315, 23);
+  Type("3.5");
+  PressKey(VK_RETURN);
+  EXPECT_TRUE(WaitFor([&] { return StateOf(filter) == typed; }, 2000));
+  EXPECT_EQ(SettledDifferences(page, "typed.rgb"), 0);
 }

@@ -36,6 +36,7 @@ press 315 23
 release 315 23
 type 3.5
 key 13
+tick 1
 EVENTS
 "$cli" snapshot --events typed.events --save-state typed.stp typed.png
 raw typed.png typed.rgb
