@@ -164,6 +164,23 @@ inline HWND FindThreadWindow(DWORD thread, const std::wstring& title, const wcha
   return search.found;
 }
 
+// The thread's visible top-level windows as "class 'title'" lines, for failure messages.
+inline std::string DescribeWindows(DWORD thread) {
+  std::string out;
+  EnumThreadWindows(
+      thread,
+      [](HWND w, LPARAM p) -> BOOL {
+        char text[128] = {}, cls[64] = {};
+        GetWindowTextA(w, text, 128);
+        GetClassNameA(w, cls, 64);
+        if (IsWindowVisible(w))
+          *reinterpret_cast<std::string*>(p) += std::string(cls) + " '" + text + "'" + (IsWindowEnabled(w) ? "" : " disabled") + "\n";
+        return TRUE;
+      },
+      reinterpret_cast<LPARAM>(&out));
+  return out;
+}
+
 // Waits for a window of the thread and returns it (null after the timeout).
 inline HWND WaitForWindow(DWORD thread, const std::wstring& title, const wchar_t* cls = L"#32770") {
   HWND w = nullptr;

@@ -144,3 +144,163 @@ TEST_F(PageTest, MouseAndKeysChangeTheSettingsAsOnLinux) {
   EXPECT_TRUE(WaitFor([&] { return StateOf(filter) == typed; }, 2000));
   EXPECT_EQ(SettledDifferences(page, "typed.rgb"), 0);
 }
+
+namespace {
+
+// Opens the preset menu with a right press and returns its window, or null. The release is the caller's,
+// once the menu has closed (a posted release would reach the menu at the cursor's real position).
+HWND OpenMenu(const FrameSession& frame) {
+  // Keys reach the menu only while its owner's frame is the foreground window.
+  SetForegroundWindow(frame.frame());
+  WaitFor([&] { return GetForegroundWindow() == frame.frame(); }, 2000);
+  PostMessageW(frame.page(), WM_RBUTTONDOWN, MK_RBUTTON, MAKELPARAM(400, 100));
+  return WaitForWindow(frame.thread(), L"", L"#32768");
+}
+
+void ReleaseRight(const FrameSession& frame) {
+  PostMessageW(frame.page(), WM_RBUTTONUP, 0, MAKELPARAM(400, 100));
+}
+
+HMENU MenuOf(HWND menuWindow) { return reinterpret_cast<HMENU>(SendMessageW(menuWindow, MN_GETHMENU, 0, 0)); }
+
+std::wstring ItemText(HMENU menu, int position) {
+  wchar_t text[128] = {};
+  GetMenuStringW(menu, position, text, 128, MF_BYPOSITION);
+  return text;
+}
+
+// Runs a menu command by its accelerator key and returns the dialog it opens.
+HWND OpenDialog(const FrameSession& frame, WORD key, const std::wstring& title) {
+  HWND menu = OpenMenu(frame);
+  if (!menu) return nullptr;
+  PressKey(key);
+  HWND dialog = WaitForWindow(frame.thread(), title);
+  if (!IsWindow(menu)) ReleaseRight(frame);
+  return dialog;
+}
+
+// Sets the combo's text as typing it would, and tells the dialog so; handled when the call returns.
+void TypeName(HWND dialog, const std::wstring& name) {
+  SetDlgItemTextW(dialog, 168, name.c_str());
+  SendMessageW(dialog, WM_COMMAND, MAKEWPARAM(168, CBN_EDITCHANGE), reinterpret_cast<LPARAM>(GetDlgItem(dialog, 168)));
+}
+
+void Press(HWND dialog, int id) {
+  PostMessageW(dialog, WM_COMMAND, MAKEWPARAM(id, BN_CLICKED), reinterpret_cast<LPARAM>(GetDlgItem(dialog, id)));
+}
+
+bool Closed(HWND dialog) { return WaitFor([&] { return !IsWindow(dialog); }); }
+
+// Answers a message box showing text with the button id; an empty result when done, else what went wrong.
+std::string Answer(const FrameSession& frame, const std::wstring& caption, const std::wstring& text, int id) {
+  HWND box = WaitForWindow(frame.thread(), caption);
+  if (!box) return "no message box; windows:\n" + DescribeWindows(frame.thread());
+  if (!ShowsText(box, text)) return "the message box shows another text";
+  PostMessageW(box, WM_COMMAND, id, 0);
+  return Closed(box) ? "" : "the message box stays";
+}
+
+
+int ListCount(HWND dialog) { return static_cast<int>(SendDlgItemMessageW(dialog, 168, CB_GETCOUNT, 0, 0)); }
+
+}  // namespace
+
+TEST_F(PageTest, ThePresetMenuAndDialogsSaveLoadBrowseAndDelete) {
+  FrameSession frame(filter.inner);
+  ASSERT_NE(frame.page(), nullptr);
+  SetForegroundWindow(frame.frame());
+  const fs::path presets = ModuleFolder() / "Presets";
+
+  // No preset yet: Quick Load is greyed.
+  HWND menu = OpenMenu(frame);
+  ASSERT_NE(menu, nullptr);
+  HMENU items = MenuOf(menu);
+  ASSERT_EQ(GetMenuItemCount(items), 9);
+  EXPECT_EQ(ItemText(items, 0), L"&Load Preset");
+  EXPECT_EQ(ItemText(items, 2), L"&Quick Load");
+  EXPECT_TRUE(GetMenuState(items, 2, MF_BYPOSITION) & MF_GRAYED);
+  EXPECT_TRUE(GetMenuState(items, 4, MF_BYPOSITION) & MF_CHECKED);  // "Left To Right Gradient"
+  PressKey(VK_ESCAPE);
+  ASSERT_TRUE(Closed(menu));
+  ReleaseRight(frame);
+
+  // Save As into the missing folder creates it and writes the current settings.
+  filter.Core()->setValue(kDecay, 61);
+  const std::vector<uint8_t> saved = StateOf(filter);
+  HWND save = OpenDialog(frame, 'S', L"Save Preset As");
+  ASSERT_NE(save, nullptr);
+  TypeName(save, L"mine");
+  Press(save, IDOK);
+  ASSERT_TRUE(Closed(save)) << DescribeWindows(frame.thread());
+  EXPECT_EQ(ReadFile((presets / "mine.stp").string()), saved);
+
+  // Saving again under that name asks first; No keeps the file as it was.
+  filter.Core()->setValue(kDecay, 12);
+  save = OpenDialog(frame, 'S', L"Save Preset As");
+  ASSERT_NE(save, nullptr);
+  TypeName(save, L"mine");
+  Press(save, IDOK);
+  EXPECT_EQ(Answer(frame, L"Warning", L"Preset already exists\nDo you want to overwrite your settings?", IDNO), "");
+  ASSERT_TRUE(Closed(save)) << DescribeWindows(frame.thread());
+  EXPECT_EQ(ReadFile((presets / "mine.stp").string()), saved);
+
+  // The preset now appears under Quick Load, and choosing it loads it.
+  menu = OpenMenu(frame);
+  ASSERT_NE(menu, nullptr);
+  HMENU quick = GetSubMenu(MenuOf(menu), 2);
+  EXPECT_FALSE(GetMenuState(MenuOf(menu), 2, MF_BYPOSITION) & MF_GRAYED);
+  ASSERT_EQ(GetMenuItemCount(quick), 1);
+  EXPECT_EQ(ItemText(quick, 0), L"mine");
+  PressKey('Q');
+  PressKey(VK_DOWN);  // the only item, whether or not opening the submenu selected it
+  PressKey(VK_RETURN);
+  EXPECT_TRUE(Closed(menu)) << DescribeWindows(frame.thread());
+  ReleaseRight(frame);
+  EXPECT_TRUE(WaitFor([&] { return StateOf(filter) == saved; }, 2000));
+
+  // Load: browsing applies each preset (by typing, in any letter case, or by picking it from the list);
+  // Cancel restores the settings from before the dialog bit for bit.
+  for (const char* name : {"first", "second", "third"})
+    fs::copy_file(kCases + "/" + name + ".stp", presets / (std::string(name) + ".stp"));
+  filter.Core()->setValue(kDamping, 7);
+  const std::vector<uint8_t> before = StateOf(filter);
+  HWND load = OpenDialog(frame, 'L', L"Load Preset");
+  ASSERT_NE(load, nullptr);
+  EXPECT_EQ(ListCount(load), 4);
+  TypeName(load, L"first");
+  EXPECT_EQ(StateOf(filter), ReadFile(kCases + "/first.stp"));
+  TypeName(load, L"SECOND");
+  EXPECT_EQ(StateOf(filter), ReadFile(kCases + "/second.stp"));
+  const LRESULT third = SendDlgItemMessageW(load, 168, CB_FINDSTRINGEXACT, static_cast<WPARAM>(-1),
+                                            reinterpret_cast<LPARAM>(L"third"));
+  SendDlgItemMessageW(load, 168, CB_SETCURSEL, static_cast<WPARAM>(third), 0);
+  PostMessageW(load, WM_COMMAND, MAKEWPARAM(168, CBN_SELCHANGE), reinterpret_cast<LPARAM>(GetDlgItem(load, 168)));
+  EXPECT_TRUE(WaitFor([&] { return StateOf(filter) == ReadFile(kCases + "/third.stp"); }, 2000));
+  Press(load, IDCANCEL);
+  ASSERT_TRUE(Closed(load)) << DescribeWindows(frame.thread());
+  EXPECT_EQ(StateOf(filter), before);
+
+  // A name that is not listed is refused and the dialog stays; Delete removes a preset from the list and the
+  // folder at once.
+  load = OpenDialog(frame, 'L', L"Load Preset");
+  ASSERT_NE(load, nullptr);
+  TypeName(load, L"fourth");
+  Press(load, IDOK);
+  EXPECT_EQ(Answer(frame, L"Error", L"Preset do not exist", IDOK), "");
+  EXPECT_TRUE(IsWindow(load));
+  TypeName(load, L"first");
+  Press(load, 169);
+  EXPECT_TRUE(WaitFor([&] { return ListCount(load) == 3; }, 2000));
+  EXPECT_FALSE(fs::exists(presets / "first.stp"));
+  Press(load, IDCANCEL);
+  ASSERT_TRUE(Closed(load)) << DescribeWindows(frame.thread());
+
+  save = OpenDialog(frame, 'S', L"Save Preset As");
+  ASSERT_NE(save, nullptr);
+  TypeName(save, L"second");
+  Press(save, 169);
+  EXPECT_TRUE(WaitFor([&] { return ListCount(save) == 2; }, 2000));
+  EXPECT_FALSE(fs::exists(presets / "second.stp"));
+  Press(save, IDCANCEL);
+  ASSERT_TRUE(Closed(save)) << DescribeWindows(frame.thread());
+}
