@@ -23,13 +23,6 @@
 namespace ulvetta {
 namespace test {
 
-// Build paths arrive as POSIX paths; Wine maps the root to drive Z:.
-inline std::wstring WinePath(const std::string& posix) {
-  std::wstring w = L"Z:";
-  for (char c : posix) w += (c == '/') ? L'\\' : static_cast<wchar_t>(c);
-  return w;
-}
-
 // Polls until found() is true or timeoutMs pass; true when found.
 inline bool WaitFor(const std::function<bool()>& found, DWORD timeoutMs = 10000) {
   const DWORD deadline = GetTickCount() + timeoutMs;
@@ -233,12 +226,72 @@ inline void Click(HWND page, int x, int y) {
   Mouse(page, WM_LBUTTONUP, x, y, 0);
 }
 
-// The filter's property frame, open on a thread of its own until this object is destroyed.
+// The host's window thread: opens the filter's property frame when asked, one at a time, as a host application's
+// user-interface thread does. The page and filter classes are served in process while it runs.
+class HostThread {
+ public:
+  HostThread()
+      : request_(CreateEventW(nullptr, FALSE, FALSE, nullptr)), done_(CreateEventW(nullptr, FALSE, FALSE, nullptr)) {
+    thread_ = std::thread([this] { run(); });
+  }
+  ~HostThread() {
+    filter_ = nullptr;
+    SetEvent(request_);
+    thread_.join();
+    CloseHandle(request_);
+    CloseHandle(done_);
+  }
+  HostThread(const HostThread&) = delete;
+
+  DWORD id() const { return id_; }
+  void open(IUnknown* filter) {
+    filter_ = filter;
+    SetEvent(request_);
+  }
+  // Waits until the frame's call returned: its result, or E_PENDING after the timeout.
+  HRESULT waitClosed(DWORD timeoutMs = 10000) {
+    return WaitForSingleObject(done_, timeoutMs) == WAIT_OBJECT_0 ? result_ : E_PENDING;
+  }
+
+ private:
+  void run() {
+    id_ = GetCurrentThreadId();
+    OleInitialize(nullptr);
+    LocalFactory filterFactory(CLSID_UlvettaFilter), pageFactory(CLSID_UlvettaPropertyPage);
+    DWORD cookies[2] = {};
+    CoRegisterClassObject(CLSID_UlvettaFilter, &filterFactory, CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE, &cookies[0]);
+    CoRegisterClassObject(CLSID_UlvettaPropertyPage, &pageFactory, CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE,
+                          &cookies[1]);
+    while (WaitForSingleObject(request_, INFINITE) == WAIT_OBJECT_0 && filter_) {
+      CAUUID pages{};
+      Query<ISpecifyPropertyPages>(filter_)->GetPages(&pages);
+      IUnknown* objects[] = {filter_};
+      result_ = OleCreatePropertyFrame(nullptr, 20, 20, L"Ulvetta", 1, objects, pages.cElems, pages.pElems, 0, 0,
+                                       nullptr);
+      CoTaskMemFree(pages.pElems);
+      SetEvent(done_);
+    }
+    CoRevokeClassObject(cookies[0]);
+    CoRevokeClassObject(cookies[1]);
+    OleUninitialize();
+  }
+
+  HANDLE request_, done_;
+  std::thread thread_;
+  std::atomic<DWORD> id_{0};
+  std::atomic<IUnknown*> filter_{nullptr};
+  HRESULT result_ = E_PENDING;
+};
+
+// The process's host thread (made by the test environment).
+HostThread& Host();
+
+// The filter's property frame, open on the host thread until this object is destroyed.
 class FrameSession {
  public:
-  explicit FrameSession(IUnknown* filter) : filter_(filter) {
-    thread_ = std::thread([this] { run(); });
-    WaitFor([this] { return done_ || (frame_ = FindThreadWindow(threadId_, L"")) != nullptr; });
+  explicit FrameSession(IUnknown* filter) : host_(Host()) {
+    host_.open(filter);
+    WaitFor([this] { return (frame_ = FindThreadWindow(host_.id(), L"")) != nullptr; });
     if (frame_) WaitFor([this] { return (page_ = FindPageWindow(frame_)) != nullptr; });
   }
   ~FrameSession() { close(); }
@@ -246,44 +299,23 @@ class FrameSession {
 
   // Closes the frame as its Cancel button does and waits until the call that opened it returned.
   void close() {
-    if (!thread_.joinable()) return;
+    if (closed_) return;
+    closed_ = true;
     if (frame_ && IsWindow(frame_)) PostMessageW(frame_, WM_COMMAND, IDCANCEL, 0);
-    thread_.join();
+    result_ = host_.waitClosed();
   }
 
   HWND frame() const { return frame_; }
   HWND page() const { return page_; }
-  DWORD thread() const { return threadId_; }
+  DWORD thread() const { return host_.id(); }
   HRESULT result() const { return result_; }
   EditorWindow* editor() const { return reinterpret_cast<EditorWindow*>(GetWindowLongPtrW(page_, GWLP_USERDATA)); }
 
  private:
-  void run() {
-    threadId_ = GetCurrentThreadId();
-    OleInitialize(nullptr);
-    LocalFactory filterFactory(CLSID_UlvettaFilter), pageFactory(CLSID_UlvettaPropertyPage);
-    DWORD cookies[2] = {};
-    CoRegisterClassObject(CLSID_UlvettaFilter, &filterFactory, CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE, &cookies[0]);
-    CoRegisterClassObject(CLSID_UlvettaPropertyPage, &pageFactory, CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE,
-                          &cookies[1]);
-    CAUUID pages{};
-    Query<ISpecifyPropertyPages>(filter_)->GetPages(&pages);
-    IUnknown* objects[] = {filter_};
-    result_ = OleCreatePropertyFrame(nullptr, 20, 20, L"Ulvetta", 1, objects, pages.cElems, pages.pElems, 0, 0,
-                                     nullptr);
-    CoTaskMemFree(pages.pElems);
-    CoRevokeClassObject(cookies[0]);
-    CoRevokeClassObject(cookies[1]);
-    OleUninitialize();
-    done_ = true;
-  }
-
-  IUnknown* filter_;
-  std::thread thread_;
-  std::atomic<DWORD> threadId_{0};
-  std::atomic<bool> done_{false};
+  HostThread& host_;
   HWND frame_ = nullptr;
   HWND page_ = nullptr;
+  bool closed_ = false;
   HRESULT result_ = E_PENDING;
 };
 

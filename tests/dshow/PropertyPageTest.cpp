@@ -3,9 +3,12 @@
 // Linux; and the frame opens and closes while audio streams, leaving no window, hook or GDI object behind.
 #include <gtest/gtest.h>
 
+#include <winternl.h>
+
 #include <filesystem>
 #include <fstream>
 
+#include "GraphHost.h"
 #include "PageRig.h"
 #include "editor/win32/EditorLock.h"
 #include "editor/win32/KeyboardHook.h"
@@ -18,15 +21,32 @@ using namespace ulvetta::test;
 namespace fs = std::filesystem;
 
 namespace {
+std::unique_ptr<HostThread> g_host;
+}  // namespace
+
+namespace ulvetta {
+namespace test {
+HostThread& Host() { return *g_host; }
+}  // namespace test
+}  // namespace ulvetta
+
+namespace {
 
 const std::string kCases = ULVETTA_PAGE_CASES;
 
-class EditorLockEnvironment : public ::testing::Environment {
+// The editor lock, made as the module makes it when loaded, and the host's window thread.
+class PageEnvironment : public ::testing::Environment {
  public:
-  void SetUp() override { ASSERT_TRUE(createEditorLock()); }
-  void TearDown() override { deleteEditorLock(); }
+  void SetUp() override {
+    ASSERT_TRUE(createEditorLock());
+    g_host = std::make_unique<HostThread>();
+  }
+  void TearDown() override {
+    g_host.reset();
+    deleteEditorLock();
+  }
 };
-const auto* const g_lock = ::testing::AddGlobalTestEnvironment(new EditorLockEnvironment);
+const auto* const g_environment = ::testing::AddGlobalTestEnvironment(new PageEnvironment);
 
 std::vector<unsigned char> ReadFile(const std::string& path) {
   std::ifstream f(path, std::ios::binary);
@@ -303,4 +323,169 @@ TEST_F(PageTest, ThePresetMenuAndDialogsSaveLoadBrowseAndDelete) {
   EXPECT_FALSE(fs::exists(presets / "second.stp"));
   Press(save, IDCANCEL);
   ASSERT_TRUE(Closed(save)) << DescribeWindows(frame.thread());
+}
+
+namespace {
+
+// A plain top-level window to hold pages without a frame.
+HWND MakeHostWindow() {
+  WNDCLASSW wc{};
+  wc.lpfnWndProc = DefWindowProcW;
+  wc.hInstance = GetModuleHandleW(nullptr);
+  wc.lpszClassName = L"UlvettaPageHost";
+  RegisterClassW(&wc);
+  return CreateWindowW(L"UlvettaPageHost", L"Pages", WS_OVERLAPPEDWINDOW | WS_VISIBLE, 0, 0, 800, 500, nullptr,
+                       nullptr, wc.hInstance, nullptr);
+}
+
+// A page activated in parent and painted once (which attaches it to the keyboard hook).
+ComRef<IPropertyPage> ShowPage(IUnknown* filter, HWND parent, int top) {
+  HRESULT hr = E_FAIL;
+  ComRef<IPropertyPage> page(static_cast<IPropertyPage*>(EditorPropertyPage::CreateInstance(nullptr, &hr)));
+  page->SetObjects(1, &filter);
+  const RECT r{0, top, kEditorWidth, top + kEditorHeight};
+  page->Activate(parent, &r, FALSE);
+  page->Show(SW_SHOW);
+  UpdateWindow(static_cast<EditorPropertyPage*>(page.get())->window());
+  return page;
+}
+
+EditorWindow* EditorOf(const ComRef<IPropertyPage>& page) {
+  return reinterpret_cast<EditorWindow*>(
+      GetWindowLongPtrW(static_cast<EditorPropertyPage*>(page.get())->window(), GWLP_USERDATA));
+}
+
+// Live GDI objects of the process, counted in the handle table the system shares with it.
+int GdiObjects() {
+  using Query = NTSTATUS(WINAPI*)(HANDLE, PROCESSINFOCLASS, PVOID, ULONG, PULONG);
+  const auto query = reinterpret_cast<Query>(
+      reinterpret_cast<void*>(GetProcAddress(GetModuleHandleW(L"ntdll.dll"), "NtQueryInformationProcess")));
+  PROCESS_BASIC_INFORMATION info{};
+  if (!query || query(GetCurrentProcess(), ProcessBasicInformation, &info, sizeof info, nullptr) != 0) return -1;
+  const auto* peb = reinterpret_cast<const uint8_t*>(info.PebBaseAddress);
+  const auto* table = *reinterpret_cast<const uint8_t* const*>(peb + 0xF8);  // GdiSharedHandleTable
+  if (!table) return -1;
+  constexpr int kEntries = 0x10000, kEntrySize = 24, kTypeOffset = 14;
+  int live = 0;
+  for (int i = 0; i < kEntries; ++i) live += table[i * kEntrySize + kTypeOffset] != 0;
+  return live;
+}
+
+// Windows of this process, top-level and children.
+int ProcessWindows() {
+  int count = 0;
+  EnumWindows(
+      [](HWND w, LPARAM p) -> BOOL {
+        DWORD pid = 0;
+        GetWindowThreadProcessId(w, &pid);
+        if (pid != GetCurrentProcessId()) return TRUE;
+        auto* n = reinterpret_cast<int*>(p);
+        ++*n;
+        EnumChildWindows(w, [](HWND, LPARAM q) -> BOOL { return ++*reinterpret_cast<int*>(q), TRUE; }, p);
+        return TRUE;
+      },
+      reinterpret_cast<LPARAM>(&count));
+  return count;
+}
+
+}  // namespace
+
+TEST_F(PageTest, TwoEditorsShareOneHookThatTakesOnlyFreshKeyPresses) {
+  const HWND host = MakeHostWindow();
+  ASSERT_NE(host, nullptr);
+  SetForegroundWindow(host);
+  ASSERT_TRUE(WaitFor([&] { return GetForegroundWindow() == host; }, 2000));
+  ComRef<IPropertyPage> first = ShowPage(filter.inner, host, 0), second = ShowPage(filter.inner, host, 200);
+  EXPECT_TRUE(keyboardHookInstalled());
+  EXPECT_EQ(attachedEditorWindows(), 2);
+
+  // A repeated press and a release are passed on; a fresh press goes to the first editor that uses it.
+  EXPECT_EQ(editorKeyboardHook(HC_ACTION, VK_TAB, 3), 0);
+  EXPECT_EQ(editorKeyboardHook(HC_ACTION, VK_TAB, 1 | (LPARAM{1} << 30) | (LPARAM{1} << 31)), 0);
+  EXPECT_EQ(EditorOf(first)->currentPage(), kReverbPage);
+  EXPECT_EQ(editorKeyboardHook(HC_ACTION, VK_TAB, 1), 1);
+  EXPECT_EQ(EditorOf(first)->currentPage(), kFilterPage);
+  EXPECT_EQ(EditorOf(second)->currentPage(), kReverbPage);
+
+  // A left press while the right button is held is ignored: no capture, no change.
+  const int32_t preDelay = filter.Core()->getValue(kPreDelay);
+  SendMessageW(static_cast<EditorPropertyPage*>(second.get())->window(), WM_LBUTTONDOWN, MK_LBUTTON | MK_RBUTTON,
+               MAKELPARAM(284, 120));
+  EXPECT_EQ(GetCapture(), nullptr);
+  EXPECT_EQ(filter.Core()->getValue(kPreDelay), preDelay);
+
+  // Closing one leaves the hook for the other; closing the last removes it.
+  first->Deactivate();
+  EXPECT_TRUE(keyboardHookInstalled());
+  EXPECT_EQ(attachedEditorWindows(), 1);
+  second->Deactivate();
+  EXPECT_FALSE(keyboardHookInstalled());
+  EXPECT_EQ(attachedEditorWindows(), 0);
+
+  // Pages made, shown, painted, asked for their size and closed leave no GDI object behind (counted in the
+  // handle table the system shares with the process; first checked to see what is made).
+  const int gdiBefore = GdiObjects();
+  HBRUSH brushes[5];
+  for (HBRUSH& b : brushes) b = CreateSolidBrush(RGB(1, 2, 3));
+  ASSERT_EQ(GdiObjects(), gdiBefore + 5);
+  for (HBRUSH b : brushes) DeleteObject(b);
+  for (int i = 0; i < 20; ++i) {
+    ComRef<IPropertyPage> page = ShowPage(filter.inner, host, 0);
+    PROPPAGEINFO info{};
+    ASSERT_EQ(page->GetPageInfo(&info), S_OK);
+    EXPECT_GE(info.size.cx, kEditorWidth);
+    EXPECT_GE(info.size.cy, kEditorHeight);
+    CoTaskMemFree(info.pszTitle);
+    CoTaskMemFree(info.pszHelpFile);
+    page->Deactivate();
+  }
+  EXPECT_EQ(GdiObjects(), gdiBefore);
+  DestroyWindow(host);
+}
+
+TEST_F(PageTest, OpeningAndClosingFiftyTimesWhileStreamingLeavesNothingBehindAndChangesNoSample) {
+  const std::wstring wav = WinePath(kCases + "/stream.wav");
+  GraphOptions plain;
+  GraphResult reference;
+  {
+    FilterHolder other;
+    ComRef<IBaseFilter> f = other.As<IBaseFilter>();
+    plain.filter = f.get();
+    reference = RunGraph(wav, plain);
+  }
+  ASSERT_EQ(reference.hr, S_OK) << reference.step;
+
+  int windows = -1, cycles = 0, moving = 0;
+  DWORD cyclesEnd = 0;
+  GraphOptions streamed;
+  ComRef<IBaseFilter> f = filter.As<IBaseFilter>();
+  streamed.filter = f.get();
+  streamed.realTime = true;
+  streamed.whileRunning = [&] {
+    // One cycle first, so that what the system makes once for the host thread exists before counting.
+    { FrameSession warm(filter.inner); }
+    windows = ProcessWindows();
+    for (; cycles < 50; ++cycles) {
+
+      FrameSession frame(filter.inner);
+      if (!frame.page()) break;
+      // The needle follows the level while the page is open: the meter face changes within 150 ms.
+      const Capture before = CaptureClient(frame.page(), 205, 140);
+      Sleep(150);
+      moving += CaptureClient(frame.page(), 205, 140).pixels != before.pixels;
+    }
+    cyclesEnd = GetTickCount();
+  };
+  const DWORD start = GetTickCount();
+  const GraphResult r = RunGraph(wav, streamed);
+  ASSERT_EQ(r.hr, S_OK) << r.step;
+  EXPECT_TRUE(r.completed);
+  EXPECT_EQ(cycles, 50);
+  // Every frame opened and closed while audio was flowing (the file plays for 20 s).
+  EXPECT_LT(cyclesEnd - start, 19000u);
+  EXPECT_GE(moving, 40) << "the meter's needle did not move while streaming";
+  EXPECT_EQ(ProcessWindows(), windows);
+  EXPECT_FALSE(keyboardHookInstalled());
+  EXPECT_EQ(attachedEditorWindows(), 0);
+  EXPECT_EQ(r.samples, reference.samples);
 }

@@ -46,6 +46,6 @@ raw typed.png typed.rgb
 "$cli" presets save second --algorithm 3 --set "Pre Delay=80" --dir . >/dev/null
 "$cli" presets save third --algorithm 7 --set "Damping=40" --dir . >/dev/null
 
-# 12 s of tones and noise, long enough to stream at the speed of the clock while the page opens and closes.
-sox -D -n -r 44100 -c 2 -b 16 stream.wav synth 12 sine 220 sine 330 tremolo 3 60 gain -9
+# 20 s of tremolo tones, long enough to stream at the speed of the clock while the page opens and closes.
+sox -D -n -r 44100 -c 2 -b 16 stream.wav synth 20 sine 220 sine 330 tremolo 3 60 gain -9
 echo "made the page cases in $out"

@@ -9,6 +9,12 @@ if [ -z "${DISPLAY:-}" ]; then
   exec xvfb-run -a -s "-screen 0 1280x1024x24" bash "$0" "$@"
 fi
 export ULVETTA_WINEPREFIX="${ULVETTA_WINEPREFIX:-${root}/build/wineprefix-display}"
+# No window manager runs on the private display: Wine must not wait for one (it would wait 2 s for every
+# window that is hidden or destroyed), so its windows are unmanaged.
+wine_run="$1"
+if ! grep -qs '"Managed"="N"' "${ULVETTA_WINEPREFIX}/user.reg"; then
+  "${wine_run}" reg add 'HKCU\Software\Wine\X11 Driver' /v Managed /d N /f >/dev/null 2>&1
+fi
 rc=0
 "$@" || rc=$?
 # The prefix's Wine session must end while its display still exists.
