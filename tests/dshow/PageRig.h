@@ -65,9 +65,10 @@ struct Capture {
   uint32_t at(int x, int y) const { return pixels[static_cast<size_t>(y) * width + x] & 0xFFFFFF; }
 };
 
-// (x, y, w, h) of window's client area, after the window has painted everything pending.
-inline Capture CaptureClient(HWND window, int w, int h) {
-  RedrawWindow(window, nullptr, nullptr, RDW_UPDATENOW);
+// (0, 0, w, h) of window's client area, or of the whole window with its frame, after the window has painted
+// everything pending.
+inline Capture CaptureClient(HWND window, int w, int h, bool whole = false) {
+  RedrawWindow(window, nullptr, nullptr, RDW_UPDATENOW | (whole ? RDW_FRAME | RDW_ALLCHILDREN : 0));
   Capture c;
   c.width = w;
   c.height = h;
@@ -75,7 +76,7 @@ inline Capture CaptureClient(HWND window, int w, int h) {
   BITMAPINFO info{};
   info.bmiHeader = {sizeof(BITMAPINFOHEADER), w, -h, 1, 32, BI_RGB, 0, 0, 0, 0, 0};
   void* bits = nullptr;
-  HDC screen = GetDC(window);
+  HDC screen = whole ? GetWindowDC(window) : GetDC(window);
   HDC memory = CreateCompatibleDC(screen);
   HBITMAP dib = CreateDIBSection(memory, &info, DIB_RGB_COLORS, &bits, nullptr, 0);
   HGDIOBJ old = SelectObject(memory, dib);

@@ -120,6 +120,11 @@ TEST_F(PageTest, TheFrameShowsTheWholeEditorAsTheSnapshotDrawsIt) {
   ReleaseDC(frame.page(), dc);
 
   EXPECT_EQ(SettledDifferences(frame.page(), "reverb.rgb"), 0);
+  // The frame as a user sees it, for the documentation.
+  RECT outer;
+  GetWindowRect(frame.frame(), &outer);
+  EXPECT_TRUE(SaveBmp(CaptureClient(frame.frame(), outer.right - outer.left, outer.bottom - outer.top, true),
+                      WinePath(kCases + "/property-frame.bmp")));
   Click(frame.page(), 527, 145);  // page button 2
   EXPECT_EQ(SettledDifferences(frame.page(), "filter.rgb"), 0);
   Click(frame.page(), 140, 18);  // the logo
