@@ -75,9 +75,12 @@ Capture CapturePage(HWND page) { return CaptureClient(page, kEditorWidth, kEdito
 
 // The differences once the page has settled: painted, and its 50 ms timer run at least once (the load bar
 // is drawn by the first tick). Any difference left after two seconds is a real one.
+// A page that differs is kept beside the reference as "failed-" + the reference's name + ".bmp".
 int SettledDifferences(HWND page, const std::string& rgbFile, RECT exclude = {0, 0, 0, 0}) {
   int d = -1;
-  WaitFor([&] { return (d = Differences(CapturePage(page), rgbFile, exclude)) == 0; }, 2000);
+  Capture c;
+  WaitFor([&] { return (d = Differences(c = CapturePage(page), rgbFile, exclude)) == 0; }, 2000);
+  if (d != 0) SaveBmp(c, WinePath(kCases + "/failed-" + rgbFile + ".bmp"));
   return d;
 }
 

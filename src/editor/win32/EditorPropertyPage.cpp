@@ -147,7 +147,10 @@ STDMETHODIMP EditorPropertyPage::GetPageInfo(PROPPAGEINFO* info) {
 STDMETHODIMP EditorPropertyPage::Show(UINT command) {
   if (!window_) return E_UNEXPECTED;
   ShowWindow(window_, static_cast<int>(command));
-  if (command == SW_SHOW || command == SW_SHOWNORMAL) InvalidateRect(window_, nullptr, FALSE);
+  if (command == SW_SHOW || command == SW_SHOWNORMAL) {
+    InvalidateRect(window_, nullptr, FALSE);
+    repaintOnTick_ = true;
+  }
   return S_OK;
 }
 
@@ -202,6 +205,14 @@ INT_PTR EditorPropertyPage::handle(HWND window, UINT message, WPARAM wParam, LPA
       }
       host_->handleMessage(message, wParam, lParam);
       return TRUE;  // painted or nothing to paint: the dialog manager must not erase over it
+    case WM_TIMER:
+      // A frame whose own controls overlap the page without clipping may paint over it as it first shows;
+      // the first tick after showing repaints the whole page once.
+      if (repaintOnTick_) {
+        repaintOnTick_ = false;
+        RedrawWindow(window, nullptr, nullptr, RDW_INVALIDATE);
+      }
+      return host_->handleMessage(message, wParam, lParam);
     case WM_LBUTTONDOWN:
     case WM_RBUTTONDOWN:
     case WM_KILLFOCUS: {

@@ -63,6 +63,7 @@ class EditorPropertyPage : public dshow::SingleInterfaceObject<IPropertyPage> {
   std::unique_ptr<PageSet> pages_;
   HWND window_ = nullptr;
   bool hooked_ = false;
+  bool repaintOnTick_ = false;
 };
 
 }  // namespace ulvetta
