@@ -17,6 +17,13 @@ namespace test {
 
 using dshow::ComRef;
 
+// Build paths arrive as POSIX paths; Wine maps the root to drive Z:.
+inline std::wstring WinePath(const std::string& posix) {
+    std::wstring w = L"Z:";
+    for (char c : posix) w += (c == '/') ? L'\\' : static_cast<wchar_t>(c);
+    return w;
+}
+
 template <class I>
 inline ComRef<I> Query(IUnknown* u) {
     ComRef<I> p;

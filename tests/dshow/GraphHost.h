@@ -6,6 +6,7 @@
 #include <qedit.h>
 
 #include <cstring>
+#include <functional>
 #include <mutex>
 #include <string>
 #include <vector>
@@ -61,10 +62,19 @@ inline ComRef<IPin> FindPin(IBaseFilter* f, PIN_DIRECTION dir) {
     return ComRef<IPin>();
 }
 
-// Runs a WAV file through the filter. state: an 88-byte settings record to load first (may be empty).
-// replay: after the end of the stream, seek back to the start while running and play it once more.
-inline GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsigned char>& state,
-                            bool replay = false) {
+// How a graph runs besides its file.
+struct GraphOptions {
+  std::vector<unsigned char> state;  // an 88-byte settings record to load first (may be empty)
+  bool replay = false;  // after the end of the stream, seek back to the start while running and play it once more
+  IBaseFilter* filter = nullptr;  // the filter to run; null: one created through the registered server
+  bool realTime = false;          // keep the graph's clock: the stream takes as long as it plays
+  std::function<void()> whileRunning;  // called once the graph runs, before waiting for its end
+};
+
+// Runs a WAV file through the filter.
+inline GraphResult RunGraph(const std::wstring& wavPath, const GraphOptions& options) {
+  const std::vector<unsigned char>& state = options.state;
+  const bool replay = options.replay;
     GraphResult r;
     Collector collector;
     {
@@ -76,7 +86,10 @@ inline GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsig
         ComRef<IBaseFilter> source, reverb, grabber, renderer;
         if (!ok("create graph", Create(CLSID_FilterGraph, graph))) return r;
         if (!ok("add source", graph->AddSourceFilter(wavPath.c_str(), L"Source", source.put()))) return r;
-        if (!ok("create Ulvetta", Create(CLSID_UlvettaFilter, reverb))) return r;
+        if (options.filter)
+            reverb.reset(options.filter);
+        else if (!ok("create Ulvetta", Create(CLSID_UlvettaFilter, reverb)))
+            return r;
         if (!state.empty() && !ok("load state", Query<IPersistStream>(reverb.get())->Load(StreamOf(state).get())))
             return r;
         if (!ok("add Ulvetta", graph->AddFilter(reverb.get(), L"Ulvetta"))) return r;
@@ -103,11 +116,12 @@ inline GraphResult RunGraph(const std::wstring& wavPath, const std::vector<unsig
 
         ComRef<IMediaSeeking> seeking = Query<IMediaSeeking>(graph.get());
         if (seeking) seeking->GetDuration(&r.duration);
-        Query<IMediaFilter>(graph.get())->SetSyncSource(nullptr);  // as fast as the processor allows
+        if (!options.realTime) Query<IMediaFilter>(graph.get())->SetSyncSource(nullptr);  // as fast as possible
         ComRef<IMediaControl> control = Query<IMediaControl>(graph.get());
         ComRef<IMediaEvent> events;
         graph->QueryInterface(IID_IMediaEvent, reinterpret_cast<void**>(events.put()));
         if (!ok("run", control->Run())) return r;
+        if (options.whileRunning) options.whileRunning();
         // Our own deadline: WaitForCompletion and GetEvent may return early.
         auto waitForCompletion = [&]() -> HRESULT {
             const DWORD deadline = GetTickCount() + 120000;

@@ -15,13 +15,6 @@ using namespace ulvetta::test;
 
 namespace {
 
-// Build paths arrive as POSIX paths; Wine maps the root to drive Z:.
-std::wstring WinePath(const std::string& posix) {
-    std::wstring w = L"Z:";
-    for (char c : posix) w += (c == '/') ? L'\\' : static_cast<wchar_t>(c);
-    return w;
-}
-
 const std::string kCases = ULVETTA_GRAPH_CASES;
 
 HRESULT CallExport(const char* name) {
@@ -56,8 +49,11 @@ TEST(Server, UnregisteringRemovesEveryKeyAndTheModuleUnloadsOnlyWhenUnused) {
     ASSERT_EQ(CallExport("DllRegisterServer"), S_OK);
     ComRef<IBaseFilter> filter;
     ASSERT_EQ(Create(CLSID_UlvettaFilter, filter), S_OK);  // through the registered server
+    ComRef<IPropertyPage> page;
+    EXPECT_EQ(Create(CLSID_UlvettaPropertyPage, page), S_OK);
     EXPECT_EQ(CallExport("DllCanUnloadNow"), S_FALSE);
     filter.reset();
+    page.reset();
     EXPECT_EQ(CallExport("DllCanUnloadNow"), S_OK);
 }
 
@@ -70,7 +66,9 @@ TEST(Graph, OutputEqualsTheCommandLineRendererAndTheTailDrains) {
     for (std::string name, wav, state, ref; list >> name >> wav >> state >> ref;) {
         SCOPED_TRACE(name);
         ++cases;
-        GraphResult r = RunGraph(WinePath(kCases + "/" + wav), ReadFile(kCases + "/" + state));
+        GraphOptions options;
+        options.state = ReadFile(kCases + "/" + state);
+        GraphResult r = RunGraph(WinePath(kCases + "/" + wav), options);
         ASSERT_EQ(r.hr, S_OK) << r.step;
         ASSERT_TRUE(r.completed);
         // Float files reach the filter as WAVE_FORMAT_EXTENSIBLE; downstream gets a copy of that type.
@@ -105,7 +103,10 @@ TEST(Graph, SeekingPassesThroughAndASeekAfterTheEndPlaysOnUntrimmed) {
     core.setValue(kOutputLevelWet, -600);  // dry only: every input frame shows in the output
     std::vector<unsigned char> state(kCoreStateSize);
     core.saveState(state.data());
-    GraphResult r = RunGraph(WinePath(kCases + "/dc-silence-44100-f32.wav"), state, true);
+    GraphOptions options;
+    options.state = state;
+    options.replay = true;
+    GraphResult r = RunGraph(WinePath(kCases + "/dc-silence-44100-f32.wav"), options);
     ASSERT_EQ(r.hr, S_OK) << r.step;
     EXPECT_EQ(r.duration, 6000000);  // 0.6 s, from the parser through the output pin's pass-through
     ASSERT_TRUE(r.completed);

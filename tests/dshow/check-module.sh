@@ -4,7 +4,7 @@
 set -euo pipefail
 dump=$(x86_64-w64-mingw32-objdump -p -h "$1")
 imports=$(printf '%s\n' "$dump" | sed -n 's/^\s*DLL Name: //p' | tr 'A-Z' 'a-z' | sort -u | tr '\n' ' ')
-foreign=$(printf '%s\n' $imports | grep -vxE '(advapi32|gdi32|kernel32|msvcrt|ole32|oleaut32|user32)\.dll' || true)
+foreign=$(printf '%s\n' $imports | grep -vxE '(advapi32|comdlg32|gdi32|kernel32|msvcrt|ole32|oleaut32|shell32|user32)\.dll' || true)
 exports=$(printf '%s\n' "$dump" | sed -n '/\[Ordinal\/Name Pointer\] Table/,/^$/p' | grep -o 'Dll[A-Za-z]*' |
   sort | tr '\n' ' ' || true)
 status=0

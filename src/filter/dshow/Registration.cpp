@@ -4,6 +4,7 @@
 
 #include <cwchar>
 
+#include "editor/win32/EditorPropertyPage.h"
 #include "filter/dshow/DShowUtil.h"
 #include "filter/dshow/Interfaces.h"
 #include "filter/dshow/ReverbFilter.h"
@@ -13,15 +14,9 @@ namespace dshow {
 
 namespace {
 
-IUnknown* CreatePropertyPage(IUnknown*, HRESULT* hr) {
-    // The property page arrives with the editor.
-    *hr = CLASS_E_CLASSNOTAVAILABLE;
-    return nullptr;
-}
-
 const ClassEntry kClasses[] = {
     {L"Morvane Ulvetta", &CLSID_UlvettaFilter, &ReverbFilter::CreateInstance},
-    {L"Morvane Ulvetta Property Page", &CLSID_UlvettaPropertyPage, &CreatePropertyPage},
+    {L"Morvane Ulvetta Property Page", &CLSID_UlvettaPropertyPage, &EditorPropertyPage::CreateInstance},
 };
 constexpr int kClassCount = sizeof kClasses / sizeof kClasses[0];
 
@@ -66,7 +61,7 @@ HRESULT WithSetup(const ClassEntry& e, bool registering) {
     IUnknown* inner = e.create(nullptr, &hr);
     if (inner == nullptr) {
         // A class that cannot be created here has no filter-mapper record to write.
-        return (hr == E_NOINTERFACE || hr == VFW_E_NEED_OWNER || hr == CLASS_E_CLASSNOTAVAILABLE) ? S_OK : hr;
+        return (hr == E_NOINTERFACE || hr == VFW_E_NEED_OWNER) ? S_OK : hr;
     }
     inner->AddRef();
     ComRef<IAMovieSetup> setup;

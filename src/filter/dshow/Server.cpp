@@ -8,6 +8,7 @@
 
 #include <new>
 
+#include "editor/win32/EditorLock.h"
 #include "filter/dshow/DShowUtil.h"
 #include "filter/dshow/Registration.h"
 
@@ -18,8 +19,6 @@ namespace {
 
 HMODULE g_module = nullptr;
 std::atomic<long> g_lockCount{0};
-// The editor's process-wide lock (its keyboard hook and mouse handling take it).
-CRITICAL_SECTION* g_editorLock = nullptr;
 
 class ClassFactory : public SingleInterfaceObject<IClassFactory> {
 public:
@@ -67,16 +66,11 @@ extern "C" {
 BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID) {
     if (reason == DLL_PROCESS_ATTACH) {
         g_module = instance;
-        g_editorLock = new (std::nothrow) CRITICAL_SECTION;
-        if (g_editorLock == nullptr) return FALSE;
-        InitializeCriticalSection(g_editorLock);
+        // The editor's process-wide lock (its keyboard hook and mouse handling take it).
+        if (!ulvetta::createEditorLock()) return FALSE;
         DisableThreadLibraryCalls(instance);
     } else if (reason == DLL_PROCESS_DETACH) {
-        if (g_editorLock) {
-            DeleteCriticalSection(g_editorLock);
-            delete g_editorLock;
-            g_editorLock = nullptr;
-        }
+        ulvetta::deleteEditorLock();
     }
     return TRUE;
 }
