@@ -32,7 +32,7 @@ await() {
   return 1
 }
 
-Xvfb -displayfd 3 -screen 0 1024x400x24 -nolisten tcp 3>"$work/display" 2>"$work/xvfb.log" &
+Xvfb -displayfd 3 -screen 0 1024x400x24 -nolisten tcp -noreset 3>"$work/display" 2>"$work/xvfb.log" &
 pids+=($!)
 await test -s "$work/display" || fail "the X server did not start"
 export DISPLAY=":$(head -n 1 "$work/display")"
