@@ -32,7 +32,9 @@ using Clock = std::chrono::steady_clock;
 
 constexpr int kRates[] = {8000, 22050, 32000, 44100, 44101, 48000, 88200, 96000, 192000};
 constexpr int kMaxBlock = 4096;
-constexpr double kTailLimitSeconds = 120.0;
+// The longest tail the settings allow (Decay 100, no damping, the largest room) runs over two minutes; the
+// renderer gives a tail ten minutes, and so does the soak.
+constexpr double kTailLimitSeconds = 600.0;
 
 std::atomic<long long> gProgress{0};  // frames processed, for the watchdog
 std::atomic<bool> gFailed{false};
