@@ -6,17 +6,12 @@
 #include <cstring>
 
 #include "FuzzBytes.h"
-#include "filter/ReverbCore.h"
+#include "FuzzCore.h"
 
 using namespace ulvetta;
+using namespace ulvetta::fuzz;
 
 namespace {
-
-std::array<int32_t, kParamCount> valuesOf(ReverbCore& core) {
-    std::array<int32_t, kParamCount> v;
-    for (int32_t id = 0; id < kParamCount; ++id) v[id] = core.getValue(id);
-    return v;
-}
 
 // The text of id's value, checked to be terminated within the capacity.
 std::string textOf(ReverbCore& core, int32_t id, bool full) {
@@ -30,13 +25,8 @@ std::string textOf(ReverbCore& core, int32_t id, bool full) {
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    static ReverbCore& core = *[] {
-        // A low rate keeps the algorithm switches that the text of id 15 makes quick.
-        auto* c = new ReverbCore;
-        c->setFormat(1000.0f, 0, 2, 2);
-        return c;
-    }();
-    fuzz::FuzzBytes input(data, size);
+    ReverbCore& core = lowRateCore();
+    FuzzBytes input(data, size);
     const int32_t id = input.take<int8_t>();
     const std::string text = input.rest();  // stops at its first zero when passed on
     const auto before = valuesOf(core);
