@@ -22,15 +22,24 @@ namespace {
 // a compressed format cannot stall the run.
 constexpr long long kMostFrames = 1 << 22;
 
-fs::path scratchFile() {
-    const fs::path base = fs::is_directory("/dev/shm") ? fs::path("/dev/shm") : fs::temp_directory_path();
-    return base / ("ulvetta-render-fuzz-" + std::to_string(getpid()));
-}
+// The file the input is written to, one per process on tmpfs when there is one; removed at exit.
+struct ScratchFile {
+    ScratchFile() {
+        const fs::path base = fs::is_directory("/dev/shm") ? fs::path("/dev/shm") : fs::temp_directory_path();
+        path = base / ("ulvetta-render-fuzz-" + std::to_string(getpid()));
+    }
+    ~ScratchFile() {
+        std::error_code ec;
+        fs::remove(path, ec);
+    }
+    fs::path path;
+};
 
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    static const fs::path path = scratchFile();
+    static const ScratchFile scratch;
+    const fs::path& path = scratch.path;
     std::ofstream(path, std::ios::binary | std::ios::trunc).write(reinterpret_cast<const char*>(data), size);
     // The block length varies with the input so that reads straddle the input's internal chunks.
     const int block = 1 + static_cast<int>(size % 5000);
