@@ -14,6 +14,16 @@ namespace ulvetta {
 
 class ReverbCore;
 
+// A reference time (100 ns units) as a sample position at rate: milliseconds first, truncating at each
+// division. A time whose product would overflow gives the largest position any other time can give, with
+// its sign, so every position stays within +-INT64_MAX / 1000 and a block's frames can be added to it.
+inline int64_t refTimeToSamples(int64_t time, uint32_t rate) {
+    const int64_t ms = time / 10000;
+    const int64_t r = rate;
+    if (r != 0 && (ms > INT64_MAX / r || ms < -(INT64_MAX / r))) return (ms > 0 ? INT64_MAX : -INT64_MAX) / 1000;
+    return ms * r / 1000;
+}
+
 // One envelope segment in samples of the input stream.
 struct EnvelopeSegment {
     int32_t paramId;

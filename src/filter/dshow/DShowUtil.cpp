@@ -40,10 +40,5 @@ void DeleteMediaType(AM_MEDIA_TYPE* mt) {
     CoTaskMemFree(mt);
 }
 
-const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt) {
-    if (mt == nullptr || mt->pbFormat == nullptr || mt->cbFormat < 16) return nullptr;
-    return reinterpret_cast<const WAVEFORMATEX*>(mt->pbFormat);
-}
-
 }  // namespace dshow
 }  // namespace ulvetta

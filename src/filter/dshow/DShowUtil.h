@@ -1,5 +1,5 @@
 // Small helpers shared by the DirectShow side of the module: media-type copies, the module's object and
-// lock counts, reference-counted pointers and time conversion. Windows only.
+// lock counts, reference-counted pointers and the COM boundary. Windows only.
 #pragma once
 
 #include <windows.h>
@@ -21,14 +21,6 @@ HRESULT CopyMediaType(AM_MEDIA_TYPE* target, const AM_MEDIA_TYPE* source);
 void FreeMediaType(AM_MEDIA_TYPE& mt);
 // Frees a media type allocated with CoTaskMemAlloc together with what it owns.
 void DeleteMediaType(AM_MEDIA_TYPE* mt);
-
-// The WAVEFORMATEX of a media type, or null when its format block is shorter than 16 bytes.
-const WAVEFORMATEX* WaveFormatOf(const AM_MEDIA_TYPE* mt);
-
-// Reference times (100 ns) to samples at a rate: milliseconds first, truncating at each division.
-inline int64_t RefTimeToSamples(REFERENCE_TIME t, uint32_t rate) {
-    return (t / 10000) * static_cast<int64_t>(rate) / 1000;
-}
 
 // Runs the body of a COM method so that no exception crosses the interface: running out of memory
 // gives E_OUTOFMEMORY, any other exception E_FAIL. Bodies leave their object consistent when they throw.

@@ -19,6 +19,8 @@
 #include <vector>
 
 #include "filter/CoreState.h"
+#include "filter/MediaFormat.h"
+#include "filter/PersistRecord.h"
 
 namespace ulvetta {
 namespace dshow {
@@ -31,17 +33,20 @@ constexpr DWORD kMediaParamCount = kSoundParamCount;
 // safety net so that a host can never hang at end of stream.
 constexpr int64_t kMaxDrainSeconds = 300;
 
-// The type offered downstream: a copy of the input type as a stereo type (cbSize 0 when the format
-// block is longer than 16 bytes, two channels, block align and byte rate recomputed).
+// The format checks' view of a media type: major type, compression flag and format block.
+MediaFormat FormatOf(const AM_MEDIA_TYPE* mt) {
+    if (mt == nullptr) return MediaFormat{};
+    return MediaFormat{mt->majortype == MEDIATYPE_Audio, mt->bTemporalCompression != FALSE, mt->pbFormat,
+                       mt->pbFormat != nullptr ? mt->cbFormat : 0};
+}
+
+// The type offered downstream: a copy of the input type rewritten as a stereo type.
 HRESULT StereoCopyOf(const AM_MEDIA_TYPE* src, AM_MEDIA_TYPE* dst) {
-    if (WaveFormatOf(src) == nullptr) return E_INVALIDARG;
+    WaveFormat f;
+    if (!FormatOf(src).wave(&f)) return E_INVALIDARG;
     HRESULT hr = CopyMediaType(dst, src);
     if (FAILED(hr)) return hr;
-    auto* w = reinterpret_cast<WAVEFORMATEX*>(dst->pbFormat);
-    if (dst->cbFormat > 16) w->cbSize = 0;
-    w->nChannels = 2;
-    w->nBlockAlign = static_cast<WORD>(w->wBitsPerSample / 8 * 2);
-    w->nAvgBytesPerSec = w->nSamplesPerSec * w->nBlockAlign;
+    makeStereoBlock(dst->pbFormat, dst->cbFormat);
     return S_OK;
 }
 
@@ -62,20 +67,20 @@ void AnsiToWide(const char* text, WCHAR* out, int capacity) {
     out[keep] = L'\0';
 }
 
+// An IStream as the source of a settings record; keeps the result of the last read.
+struct StreamReader : RecordSource {
+    explicit StreamReader(IStream* s) : stream(s) {}
+    bool read(uint8_t* data, uint32_t count, uint32_t* got) override {
+        ULONG n = 0;
+        result = stream->Read(data, count, &n);
+        *got = n;
+        return SUCCEEDED(result);
+    }
+    IStream* stream;
+    HRESULT result = S_OK;
+};
+
 }  // namespace
-
-WORD EffectiveFormatTag(const AM_MEDIA_TYPE* mt) {
-    const WAVEFORMATEX* f = WaveFormatOf(mt);
-    if (f == nullptr) return 0;
-    if (f->wFormatTag != WAVE_FORMAT_EXTENSIBLE) return f->wFormatTag;
-    if (mt->cbFormat < sizeof(WAVEFORMATEXTENSIBLE) || f->cbSize < 22) return 0;
-    const auto* x = reinterpret_cast<const WAVEFORMATEXTENSIBLE*>(f);
-    // The KSDATAFORMAT subtypes are byte-identical to the DirectShow media subtypes.
-    if (x->SubFormat == MEDIASUBTYPE_PCM) return WAVE_FORMAT_PCM;
-    if (x->SubFormat == MEDIASUBTYPE_IEEE_FLOAT) return WAVE_FORMAT_IEEE_FLOAT;
-    return 0;
-}
-
 
 IUnknown* ReverbFilter::CreateInstance(IUnknown* outer, HRESULT* hr) {
     try {
@@ -135,29 +140,12 @@ HRESULT STDMETHODCALLTYPE ReverbFilter::NonDelegatingQueryInterface(REFIID riid,
 
 HRESULT ReverbFilter::CheckInputType(const AM_MEDIA_TYPE* mt) {
     if (mt == nullptr) return E_POINTER;
-    if (mt->majortype != MEDIATYPE_Audio || mt->bTemporalCompression) return E_INVALIDARG;
-    const WAVEFORMATEX* f = WaveFormatOf(mt);
-    if (f == nullptr || f->nChannels != 2) return E_INVALIDARG;
-    if (f->nSamplesPerSec == 0 || f->nSamplesPerSec > kMaxSampleRate) return E_INVALIDARG;
-    const WORD tag = EffectiveFormatTag(mt);
-    if (tag == WAVE_FORMAT_PCM && f->wBitsPerSample == 16) return S_OK;
-    if (tag == WAVE_FORMAT_IEEE_FLOAT && f->wBitsPerSample == 32) return S_OK;
-    return E_INVALIDARG;
+    return FormatOf(mt).acceptableInput() ? S_OK : E_INVALIDARG;
 }
 
 HRESULT ReverbFilter::CheckTransform(const AM_MEDIA_TYPE* in, const AM_MEDIA_TYPE* out) {
     if (in == nullptr || out == nullptr) return E_POINTER;
-    if (in->majortype != MEDIATYPE_Audio || out->majortype != MEDIATYPE_Audio) return E_INVALIDARG;
-    const WAVEFORMATEX* fi = WaveFormatOf(in);
-    const WAVEFORMATEX* fo = WaveFormatOf(out);
-    if (fi == nullptr || fo == nullptr || in->bTemporalCompression || out->bTemporalCompression) return E_INVALIDARG;
-    // Equal tags as written (our own offered copy keeps an extensible tag), or the same sample format.
-    const WORD tagIn = EffectiveFormatTag(in);
-    const bool sameTag = fi->wFormatTag == fo->wFormatTag || (tagIn != 0 && tagIn == EffectiveFormatTag(out));
-    if (!sameTag || fi->wBitsPerSample != fo->wBitsPerSample || fi->nSamplesPerSec != fo->nSamplesPerSec ||
-        fo->nChannels != 2)
-        return E_INVALIDARG;
-    return S_OK;
+    return FormatOf(in).transformsTo(FormatOf(out)) ? S_OK : E_INVALIDARG;
 }
 
 HRESULT ReverbFilter::GetMediaType(int position, AM_MEDIA_TYPE* mt) {
@@ -196,18 +184,20 @@ HRESULT ReverbFilter::CompleteConnect(PIN_DIRECTION dir, IPin*) {
 }
 
 HRESULT ReverbFilter::SetMediaType(PIN_DIRECTION dir, const AM_MEDIA_TYPE* mt) {
-    const WAVEFORMATEX* f = WaveFormatOf(mt);
-    if (f == nullptr) return E_INVALIDARG;
-    WAVEFORMATEX& target = dir == PINDIR_INPUT ? inputFormat_ : outputFormat_;
-    target.wFormatTag = EffectiveFormatTag(mt);
+    const MediaFormat format = FormatOf(mt);
+    WaveFormat f;
+    if (!format.wave(&f)) return E_INVALIDARG;
+    f = format.normalised();
     // The output's sample format is the input's: our offered copy of an extensible input keeps its tag
     // with no extension, which names no sample format of its own.
-    if (dir == PINDIR_OUTPUT && target.wFormatTag == 0) target.wFormatTag = inputFormat_.wFormatTag;
-    target.nChannels = f->nChannels;
-    target.nSamplesPerSec = f->nSamplesPerSec;
-    target.wBitsPerSample = f->wBitsPerSample;
-    target.nBlockAlign = static_cast<WORD>(f->wBitsPerSample / 8 * f->nChannels);
-    target.nAvgBytesPerSec = target.nSamplesPerSec * target.nBlockAlign;
+    if (dir == PINDIR_OUTPUT && f.formatTag == 0) f.formatTag = inputFormat_.wFormatTag;
+    WAVEFORMATEX& target = dir == PINDIR_INPUT ? inputFormat_ : outputFormat_;
+    target.wFormatTag = f.formatTag;
+    target.nChannels = f.channels;
+    target.nSamplesPerSec = f.samplesPerSec;
+    target.wBitsPerSample = f.bitsPerSample;
+    target.nBlockAlign = f.blockAlign;
+    target.nAvgBytesPerSec = f.avgBytesPerSec;
     target.cbSize = 0;
     if (dir == PINDIR_INPUT) {
         CritSecLock g(paramLock_);
@@ -267,7 +257,7 @@ HRESULT ReverbFilter::Receive(IMediaSample* sample) {
     const HRESULT timeResult = sample->GetTime(&start, &stop);
     if (FAILED(timeResult)) start = 0;
     const bool timed = timeResult == S_OK;
-    blockPosition_ = RefTimeToSamples(start, inputFormat_.nSamplesPerSec);
+    blockPosition_ = refTimeToSamples(start, inputFormat_.nSamplesPerSec);
     BYTE* in = nullptr;
     HRESULT hr = sample->GetPointer(&in);
     if (FAILED(hr)) return hr;
@@ -397,37 +387,17 @@ STDMETHODIMP ReverbFilter::IsDirty() {
 STDMETHODIMP ReverbFilter::Load(IStream* stream) {
     if (stream == nullptr) return E_POINTER;
     return ComBoundary([&]() -> HRESULT {
-        BYTE buffer[1024] = {};
-        ULONG got = 0;
-        HRESULT hr = stream->Read(buffer, 20, &got);
-        if (FAILED(hr)) return hr;
-        const uint32_t size = getLe32(buffer);
-        if (size <= 20) return E_UNEXPECTED;
-        const uint64_t wanted = size - 20;
-        uint64_t read = 0;
-        if (size <= sizeof buffer) {
-            hr = stream->Read(buffer + 20, static_cast<ULONG>(wanted), &got);
-            if (FAILED(hr)) return hr;
-            read = got;
-        } else {
-            // A record larger than ours cannot be valid: consume it in bounded chunks without holding it.
-            BYTE discard[1024];
-            while (read < wanted) {
-                const ULONG n = static_cast<ULONG>(std::min<uint64_t>(sizeof discard, wanted - read));
-                got = 0;
-                hr = stream->Read(discard, n, &got);
-                if (FAILED(hr)) return hr;
-                if (got == 0) break;  // the stream ended early
-                read += got;
-            }
+        StreamReader reader(stream);
+        PersistRecord record;
+        switch (record.read(reader)) {
+            case PersistRecord::Result::StreamError: return reader.result;
+            case PersistRecord::Result::Refused: return E_UNEXPECTED;
+            case PersistRecord::Result::Complete: break;
         }
-        // A record larger than the buffer is not ours; a short read leaves part of a record unknown. Both
-        // are refused like any other invalid record, without changing a parameter.
-        if (size > sizeof buffer || read < wanted) return E_UNEXPECTED;
-        if (!ChangeCore([&] { return control_->GetCore()->loadState(buffer, static_cast<int32_t>(size)); }))
+        if (!ChangeCore([&] { return control_->GetCore()->loadState(record.bytes(), record.size()); }))
             return E_UNEXPECTED;
         control_->RedrawWindows();
-        return hr;
+        return reader.result;
     });
 }
 
@@ -603,7 +573,7 @@ STDMETHODIMP ReverbFilter::AddEnvelope(DWORD index, DWORD count, MP_ENVELOPE_SEG
         std::vector<EnvelopeSegment> converted(count);
         for (DWORD i = 0; i < count; ++i) {
             const MP_ENVELOPE_SEGMENT& s = segments[i];
-            converted[i] = EnvelopeSegment{0, RefTimeToSamples(s.rtStart, rate), RefTimeToSamples(s.rtEnd, rate),
+            converted[i] = EnvelopeSegment{0, refTimeToSamples(s.rtStart, rate), refTimeToSamples(s.rtEnd, rate),
                                            s.valStart, s.valEnd, (s.iCurve & 1) != 0};
         }
         const int32_t first = index == kAllParams ? 0 : static_cast<int32_t>(index);
@@ -621,7 +591,7 @@ STDMETHODIMP ReverbFilter::FlushEnvelope(DWORD index, REFERENCE_TIME start, REFE
         if (index != kAllParams && index >= kMediaParamCount) return E_INVALIDARG;
         const int32_t first = index == kAllParams ? 0 : static_cast<int32_t>(index);
         const int32_t last = index == kAllParams ? kMediaParamCount - 1 : static_cast<int32_t>(index);
-        automation_.remove(first, last, RefTimeToSamples(start, rate), RefTimeToSamples(stop, rate));
+        automation_.remove(first, last, refTimeToSamples(start, rate), refTimeToSamples(stop, rate));
         return S_OK;
     });
 }

@@ -25,9 +25,6 @@
 namespace ulvetta {
 namespace dshow {
 
-// Sample rates outside 1..kMaxSampleRate Hz are refused: the engine sizes lines and tables from the rate.
-constexpr DWORD kMaxSampleRate = 768000;
-
 class ReverbFilter : public TransformFilter,
                      public IPersistStream,
                      public ISpecifyPropertyPages,
@@ -131,10 +128,6 @@ private:
     std::atomic<bool> rebuildPending_{false};
     int64_t blockPosition_ = 0;
 };
-
-// The effective sample format of a wave format: WAVE_FORMAT_PCM or WAVE_FORMAT_IEEE_FLOAT for a plain or
-// extensible stereo PCM/float format, otherwise the raw tag (0 for a malformed extensible block).
-WORD EffectiveFormatTag(const AM_MEDIA_TYPE* mt);
 
 }  // namespace dshow
 }  // namespace ulvetta
