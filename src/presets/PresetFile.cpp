@@ -228,17 +228,22 @@ PresetResult PresetFolder::save(const std::string& name, ReverbCore& core, Overw
 
 PresetResult PresetFolder::remove(const std::string& name) const {
     if (!presetNameProblem(name).empty()) return PresetResult::BadName;
-    PresetResult result = PresetResult::Ok;  // also when there is nothing to delete
+    // Every spelling of the suffix that is a file goes. Something else under a spelling (a folder) is left
+    // alone; it makes the deletion fail only when no file of the name was there to delete.
+    bool removed = false, blocked = false, failed = false;
     for (int v = 0; v < kSuffixVariants; ++v) {
         const fs::path target = fs::path(directory_) / (name + suffixVariant(v));
         std::error_code ec;
         const fs::file_status st = fs::symlink_status(target, ec);
         if (st.type() == fs::file_type::not_found) continue;
-        if (st.type() == fs::file_type::regular || st.type() == fs::file_type::symlink) fs::remove(target, ec);
-        if (ec || (st.type() != fs::file_type::regular && st.type() != fs::file_type::symlink))
-            result = PresetResult::IoError;
+        if (st.type() != fs::file_type::regular && st.type() != fs::file_type::symlink) {
+            blocked = true;
+            continue;
+        }
+        fs::remove(target, ec);
+        (ec ? failed : removed) = true;
     }
-    return result;
+    return failed || (blocked && !removed) ? PresetResult::IoError : PresetResult::Ok;
 }
 
 PresetResult readStateFile(const std::string& path, StateBytes& out) { return readRecord(path, out); }

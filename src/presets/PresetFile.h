@@ -79,7 +79,7 @@ public:
     PresetResult save(const std::string& name, ReverbCore& core, OverwriteQuestion& ask) const;
     // Deletes every file named name + ".stp" with the suffix in any letter case, so that the name is
     // no longer listed. A missing file is nothing to delete (Ok); something else under that name, such
-    // as a directory, is left alone (IoError).
+    // as a directory, is left alone, and is an IoError only when no file of the name was deleted.
     PresetResult remove(const std::string& name) const;
 
 private:
