@@ -2,7 +2,9 @@
 // The LV2 plugin's ports: stereo audio, one control input per parameter in the units the renderer shows,
 // and the meter, load and latency outputs. Shared by the plugin and the Turtle writer so that the
 // description always matches the code.
+#include <cmath>
 #include <cstdint>
+#include <cstdio>
 
 #include "filter/ParamTable.h"
 
@@ -48,6 +50,18 @@ inline const char* paramPortName(int32_t id) {
 inline double portValueOf(int32_t id, int32_t steps) {
   if (id == kAlgorithm || id == kMeterSource) return steps;
   return steps / kParamTable[id].scale;
+}
+
+// The value in steps that a port's reading means, exactly as the renderer reads a --set text: the algorithm
+// and meter source by index, every other parameter as the text of the reading in its shown units. A
+// non-finite reading means the default.
+inline int32_t stepsOfPortValue(int32_t id, float reading) {
+  const ParamDesc& d = kParamTable[id];
+  if (!std::isfinite(reading)) return d.defaultValue;
+  if (id == kAlgorithm || id == kMeterSource) return clampValue(d, static_cast<int32_t>(std::lround(reading)));
+  char text[kValueTextCapacity];
+  std::snprintf(text, sizeof text, "%.9g", static_cast<double>(reading));
+  return clampValue(d, parseValueText(d, text));
 }
 
 }  // namespace ulvetta::lv2

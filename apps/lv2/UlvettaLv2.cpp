@@ -106,15 +106,6 @@ class Plugin {
     if (ports_[port]) *ports_[port] = value;
   }
 
-  // The value in steps that a port's reading means, exactly as the renderer reads a --set text.
-  static int32_t stepsOf(int32_t id, float reading, char* text, size_t capacity) {
-    if (!std::isfinite(reading)) reading = static_cast<float>(portValueOf(id, kParamTable[id].defaultValue));
-    if (id == kAlgorithm || id == kMeterSource)
-      return clampValue(kParamTable[id], static_cast<int32_t>(std::lround(reading)));
-    std::snprintf(text, capacity, "%.9g", static_cast<double>(reading));
-    return clampValue(kParamTable[id], parseValueText(kParamTable[id], text));
-  }
-
   // Applies the control ports that changed since they were last applied: the algorithm first (its switch
   // loads the algorithm's remembered values, so every other port is applied again after it), then the rest
   // in id order.
@@ -130,9 +121,8 @@ class Plugin {
     }
     if (!moved && !restored_) return;
     restored_ = false;
-    char text[ReverbCore::kTextCapacity];
     if (const float* p = ports_[paramPort(kAlgorithm)]) {
-      const int32_t steps = stepsOf(kAlgorithm, *p, text, sizeof text);
+      const int32_t steps = stepsOfPortValue(kAlgorithm, *p);
       if (steps != applied_[kAlgorithm]) {
         core_->setValue(kAlgorithm, steps);
         applied_.fill(kUnapplied);
@@ -142,7 +132,7 @@ class Plugin {
     for (int32_t id = 0; id < kParamCount; ++id) {
       const float* p = ports_[paramPort(id)];
       if (id == kAlgorithm || !p) continue;
-      const int32_t steps = stepsOf(id, *p, text, sizeof text);
+      const int32_t steps = stepsOfPortValue(id, *p);
       if (steps == applied_[id]) continue;
       // A value the core already holds is not set again: setting it would rebuild a network for nothing.
       if (steps != core_->getValue(id)) core_->setValueAndNotify(id, steps);

@@ -85,16 +85,7 @@ class Ui {
     }
     if (port < kFirstParam || port >= kFirstParam + kParamCount || !std::isfinite(value)) return;
     const int32_t id = static_cast<int32_t>(port - kFirstParam);
-    const ParamDesc& d = kParamTable[id];
-    int32_t steps = 0;
-    if (id == kAlgorithm || id == kMeterSource) {
-      steps = static_cast<int32_t>(std::lround(value));
-    } else {
-      char text[ReverbCore::kTextCapacity];
-      std::snprintf(text, sizeof text, "%.9g", static_cast<double>(value));
-      steps = parseValueText(d, text);
-    }
-    steps = clampValue(d, steps);
+    const int32_t steps = stepsOfPortValue(id, value);
     shown_[id] = steps;
     sent_[id] = steps;
     if (core_.getValue(id) == steps) return;
